@@ -1,0 +1,58 @@
+// Level data files: the logger's hourly text files of 100 ms records, and their decoding.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace orv {
+
+// The six header lines of one level data file.
+struct DataFileHeader {
+    static constexpr std::size_t kSerialNumberSize = 26;  // buffer size, terminator included
+    static constexpr std::size_t kSessionTitleSize = 100;
+
+    std::uint16_t day = 0;
+    std::uint16_t month = 0;
+    std::uint16_t year = 0;
+    std::uint16_t hour = 0;
+    std::string serialNumber;  // at most kSerialNumberSize - 1 characters
+    std::string sessionTitle;  // at most kSessionTitleSize - 1 characters
+    float temperature = 0.0F;
+};
+
+// One 100 ms record.
+struct LevelRecord {
+    std::uint16_t minute = 0;
+    std::uint16_t second = 0;
+    std::uint16_t tenth = 0;  // 0..9
+    std::uint16_t spare = 0;
+    float splA = 0.0F;  // dB; negative values are stored as 0.0
+    float splC = 0.0F;
+    float leqA = 0.0F;
+    float leqC = 0.0F;
+    float battery = 0.0F;  // as written
+    std::uint32_t status = 0;  // 1 when the signal condition is 3 (overload)
+    std::uint32_t cond2Mark = 0;  // 1 when the signal condition is 2 (other gain range)
+};
+
+// The records of one file, in file order. Emptied (capacity kept) for every file.
+struct LevelRecordQueue {
+    std::vector<LevelRecord> records;
+
+    void clear() { records.clear(); }
+    bool empty() const { return records.empty(); }
+    std::size_t size() const { return records.size(); }
+};
+
+// Fills `header` from the six header lines of `data` and sets `firstRecord` to the offset
+// of line 7. False when the header is not well formed.
+bool parseDataFileHeader(const char* data, std::size_t length, DataFileHeader& header,
+                         std::size_t& firstRecord);
+
+// Replaces the queue's contents with the records in data[0, length). Decoding stops at the
+// first malformed record; the records before it stay queued.
+void decodeLevelRecords(const char* data, std::size_t length, LevelRecordQueue& queue);
+
+}  // namespace orv

@@ -1,0 +1,120 @@
+#include "platform/files.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+namespace platform {
+
+File& File::operator=(File&& other) noexcept {
+    if (this != &other) {
+        close();
+        fd_ = other.release();
+    }
+    return *this;
+}
+
+void File::close() {
+    if (fd_ >= 0) ::close(fd_);
+    fd_ = -1;
+}
+
+int File::release() {
+    const int fd = fd_;
+    fd_ = -1;
+    return fd;
+}
+
+std::size_t File::write(const void* data, std::size_t size, int* error) {
+    const char* p = static_cast<const char*>(data);
+    std::size_t done = 0;
+    while (done < size) {
+        const ssize_t w = ::write(fd_, p + done, size - done);
+        if (w < 0) {
+            if (errno == EINTR) continue;
+            if (error != nullptr) *error = errno;
+            break;
+        }
+        done += static_cast<std::size_t>(w);
+    }
+    return done;
+}
+
+std::size_t File::read(void* data, std::size_t size, int* error) {
+    char* p = static_cast<char*>(data);
+    std::size_t done = 0;
+    while (done < size) {
+        const ssize_t r = ::read(fd_, p + done, size - done);
+        if (r < 0) {
+            if (errno == EINTR) continue;
+            if (error != nullptr) *error = errno;
+            break;
+        }
+        if (r == 0) break;
+        done += static_cast<std::size_t>(r);
+    }
+    return done;
+}
+
+bool File::seekRelative(std::int64_t offset) {
+    return ::lseek(fd_, static_cast<off_t>(offset), SEEK_CUR) != static_cast<off_t>(-1);
+}
+
+std::uint64_t File::size() const {
+    struct stat st {};
+    if (::fstat(fd_, &st) != 0) return 0;
+    return static_cast<std::uint64_t>(st.st_size);
+}
+
+File openForRead(const std::string& path, int* error) {
+    const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0 && error != nullptr) *error = errno;
+    return File(fd);
+}
+
+bool readWholeFile(const std::string& path, std::vector<char>& out, int* error) {
+    File f = openForRead(path, error);
+    if (!f.valid()) return false;
+    struct stat st {};
+    if (::fstat(f.fd(), &st) != 0 || !S_ISREG(st.st_mode)) {
+        if (error != nullptr) *error = S_ISDIR(st.st_mode) ? EISDIR : errno;
+        return false;
+    }
+    const auto size = static_cast<std::size_t>(st.st_size);
+    out.resize(size);
+    return f.read(out.data(), size, error) == size;
+}
+
+File openAlways(const std::string& path, int* error) {
+    const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
+    if (fd < 0 && error != nullptr) *error = errno;
+    return File(fd);
+}
+
+File createResultFile(const std::string& path, int* error) {
+    deleteFile(path);
+    return openAlways(path, error);
+}
+
+bool readTextFile(const std::string& path, std::string& out, int* error) {
+    std::vector<char> bytes;
+    if (!readWholeFile(path, bytes, error)) return false;
+    out.clear();
+    out.reserve(bytes.size());
+    for (std::size_t i = 0; i < bytes.size(); ++i) {
+        if (bytes[i] == '\r' && i + 1 < bytes.size() && bytes[i + 1] == '\n') continue;
+        out.push_back(bytes[i]);
+    }
+    return true;
+}
+
+bool deleteFile(const std::string& path) { return ::unlink(path.c_str()) == 0; }
+
+bool fileExists(const std::string& path) {
+    struct stat st {};
+    return ::stat(path.c_str(), &st) == 0;
+}
+
+}  // namespace platform
