@@ -1,7 +1,100 @@
 #include "processing/session_driver.h"
 
+#include "platform/directory.h"
+#include "platform/files.h"
+#include "processing/record_statistics.h"
+#include "results/general_results.h"
+#include "results/leq_results.h"
+#include "results/result_files.h"
+#include "tweight.h"
+
 namespace orv {
 
-void SessionProcessor::processSession(SessionRecord& /*session*/, ProgressPipe& /*pipe*/) {}
+std::uint32_t SessionProcessor::generalTimeWeighting(const SessionRecord& session) {
+    return session.timeWeightingMs == 125 ? SlmLibrary::TWeight::F : SlmLibrary::TWeight::S;
+}
+
+ResultHeaderInfo SessionProcessor::headerInfo(const SessionRecord& session,
+                                              const DataFileHeader& header) const {
+    ResultHeaderInfo info;
+    info.serialNumber = header.serialNumber.substr(0, ResultHeaderInfo::kMaxSerialNumber);
+    info.title = header.sessionTitle.substr(0, ResultHeaderInfo::kMaxTitle);
+    info.generalWeighting = settings_.generalWeighting;
+    info.octaveFreqWeighting = settings_.octaveFreqWeighting;
+    info.statsIntervalMin = settings_.statsIntervalMin;
+    info.leqInterval = settings_.leqInterval;
+    info.timeWeightingMs = session.timeWeightingMs;
+    info.octaveTimeWeighting = settings_.octaveTimeWeighting;
+    info.sessionStart = session.sessionStart;
+    info.sessionEnd = session.sessionEnd;
+    info.percentiles = settings_.percentiles;
+    return info;
+}
+
+void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe& pipe) {
+    const std::uint32_t timeWeighting = generalTimeWeighting(session);
+    const ResultNaming naming(settings_, session, timeWeighting);
+    GeneralResultsWriter general(out_);
+    LeqResultsWriter leq(out_);
+
+    // Result files. Without its general results file a session is skipped; a Leq file
+    // that cannot be created switches short-Leq results off for the rest of the run.
+    naming.prepareSessionDirectory();
+    if (!general.open(naming.general())) return;
+    if (!platform::isDirectory(session.sessionPath)) return;
+    if (settings_.leqOn() && !leq.open(LeqFileKind::AllPass, naming.leq(LeqFileKind::AllPass, 0))) {
+        settings_.leqInterval = ProcessingSettings::kLeqOff;
+    }
+    const bool leqOn = settings_.leqOn();
+
+    RecordStatistics statistics(settings_, session.triggerOn != 0, general, leqOn ? &leq : nullptr);
+    bool headersWritten = false;
+    const std::uint32_t fileCount = session.dataFileCount();
+    for (std::uint32_t i = 0; i < fileCount; ++i) {
+        const std::string path = session.sessionPath + session.dataFiles[i];
+        if (!platform::readWholeFile(path, fileBytes_)) continue;  // skipped without progress
+
+        DataFileHeader header;
+        std::size_t firstRecord = 0;
+        records_.clear();
+        if (parseDataFileHeader(fileBytes_.data(), fileBytes_.size(), header, firstRecord)) {
+            decodeLevelRecords(fileBytes_.data() + firstRecord, fileBytes_.size() - firstRecord,
+                               records_);
+        } else {
+            header = DataFileHeader{};
+        }
+
+        if (!headersWritten) {
+            headersWritten = true;
+            const ResultHeaderInfo info = headerInfo(session, header);
+            if (general.writeHeader(info, timeWeighting) && leqOn) {
+                if (leq.formatHeader(LeqFileKind::AllPass, info, 1)) {
+                    leq.writeColumnHeader(LeqFileKind::AllPass);
+                }
+            }
+        }
+
+        for (const LevelRecord& r : records_.records) {
+            statistics.sequenceCheck(r, header);
+            if (leqOn) statistics.stepShortLeq(r, header);
+            if (!statistics.stepGeneralStatistics(r, header)) break;  // rest of the file skipped
+            statistics.takeDispatchRequest();
+        }
+
+        const float percent =
+            static_cast<float>(i + 1) / static_cast<float>(fileCount) * 100.0F;
+        if (settings_.binMode != 0) {
+            pipe.sendProgress(percent);
+            out_.print("%s Complete\r\n", session.dataFiles[i].c_str());
+        } else {
+            out_.print("%.1f %% Complete\r\n", static_cast<double>(percent));
+        }
+    }
+
+    out_.print("\r\n");
+    statistics.finishSession();
+    general.close();
+    leq.close(LeqFileKind::AllPass);
+}
 
 }  // namespace orv

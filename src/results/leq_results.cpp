@@ -1,0 +1,112 @@
+#include "results/leq_results.h"
+
+#include "fweight.h"
+#include "octave_filter.h"
+#include "results/text_buffer.h"
+#include "tweight.h"
+
+namespace orv {
+
+bool LeqResultsWriter::open(LeqFileKind kind, const std::string& path) {
+    std::lock_guard<std::mutex> lock(mutex_);
+    LeqFile& f = file(kind);
+    f.name = path;
+    f.header.clear();
+    f.lines = 0;
+    f.part = 0;
+    f.handle = createResultFile(path, out_);
+    return f.handle.valid();
+}
+
+void LeqResultsWriter::close(LeqFileKind kind) {
+    std::lock_guard<std::mutex> lock(mutex_);
+    file(kind).handle.close();
+}
+
+bool LeqResultsWriter::isOpen(LeqFileKind kind) const {
+    std::lock_guard<std::mutex> lock(mutex_);
+    return file(kind).handle.valid();
+}
+
+bool LeqResultsWriter::formatHeader(LeqFileKind kind, const ResultHeaderInfo& info,
+                                    std::uint32_t bandCount) {
+    std::lock_guard<std::mutex> lock(mutex_);
+    LeqFile& f = file(kind);
+    if (!f.handle.valid()) return false;
+    f.bandCount = bandCount;
+    const std::uint32_t leqSeconds = displayInterval(info.leqInterval);
+    if (kind == LeqFileKind::AllPass) {
+        TextBuffer averaging;
+        averaging.append("%u ms", info.timeWeightingMs);
+        f.header = formatHeaderBlock(info, kGeneralFirstLine,
+                                     SlmLibrary::FWeight::longName(info.generalWeighting),
+                                     averaging.data(), leqSeconds);
+    } else {
+        f.header = formatHeaderBlock(info, kGeneralFirstLine,
+                                     SlmLibrary::FWeight::longName(info.octaveFreqWeighting),
+                                     SlmLibrary::TWeight::longName(info.octaveTimeWeighting),
+                                     leqSeconds);
+    }
+    return true;
+}
+
+bool LeqResultsWriter::writeColumnHeader(LeqFileKind kind) {
+    std::lock_guard<std::mutex> lock(mutex_);
+    return writeColumnHeaderLocked(kind);
+}
+
+bool LeqResultsWriter::writeColumnHeaderLocked(LeqFileKind kind) {
+    LeqFile& f = file(kind);
+    f.handle.write(f.header);  // a short header write is not looked at; the column line is
+    std::string columns;
+    if (kind == LeqFileKind::AllPass) {
+        columns = "\"Date\",\"Time\",\"AP Leq\",\"Overload\"\r\n";
+    } else {
+        TextBuffer b;
+        b.append("\"Date\",\"Time\",");
+        for (std::uint32_t band = 0; band < f.bandCount; ++band) {
+            b.append("\"%s\",", f.bandCount == 36 ? SlmLibrary::OctaveFilter::getThirdName(band)
+                                                  : SlmLibrary::OctaveFilter::getFullName(band));
+        }
+        b.append("\"Overload\"\r\n");
+        columns = b.str();
+    }
+    if (f.handle.write(columns) != columns.size()) return false;
+    f.lines = kHeaderLines;
+    return true;
+}
+
+std::string LeqResultsWriter::formatRow(const LeqRow& row) {
+    TextBuffer b;
+    const platform::SystemTime& t = row.time;
+    b.append("\"%02u/%02u/%u\",\"'%02u:%02u:%02u.%01u\",", t.day, t.month, t.year, t.hour, t.minute,
+             t.second, t.milliseconds);
+    for (float v : row.levels) b.append("\"%.1f\",", static_cast<double>(v));
+    b.append("\"%u\",", row.overload);
+    b.append(row.errorsInInterval != 0 ? "\"Errors Found in Interval\"\r\n" : "\r\n");
+    return b.str();
+}
+
+bool LeqResultsWriter::writeRow(const LeqRow& row) {
+    if (row.levels.empty()) return false;
+    const LeqFileKind kind = row.levels.size() == 1 ? LeqFileKind::AllPass : LeqFileKind::Octave;
+    const std::string line = formatRow(row);
+    std::lock_guard<std::mutex> lock(mutex_);
+    LeqFile& f = file(kind);
+    if (f.name.empty()) return false;  // that file was never opened in this session
+    bool written = false;
+    if (f.handle.valid()) written = f.handle.write(line) == line.size();
+    ++f.lines;
+    if (f.lines >= linesPerPart_) rollOverLocked(kind);
+    return written;
+}
+
+void LeqResultsWriter::rollOverLocked(LeqFileKind kind) {
+    LeqFile& f = file(kind);
+    f.handle.close();
+    ++f.part;
+    f.handle = createResultFile(ResultNaming::leqPart(f.name, f.part), out_);
+    if (f.handle.valid()) writeColumnHeaderLocked(kind);
+}
+
+}  // namespace orv
