@@ -55,4 +55,14 @@ bool parseDataFileHeader(const char* data, std::size_t length, DataFileHeader& h
 // first malformed record; the records before it stay queued.
 void decodeLevelRecords(const char* data, std::size_t length, LevelRecordQueue& queue);
 
+// The steps of the header parse, each reading one line from `pos` (bounded by `end`) and
+// leaving `pos` at the start of the next line; false when the line is not well formed.
+//
+// Header lines 1 and 2: the text after the line's first comma and any blanks and commas,
+// up to a line feed, a comma or `size` - 1 characters; a carriage return before the line
+// feed is not part of it.
+bool extractHeaderField(const char*& pos, const char* end, std::string& dest, std::size_t size);
+// Header line 3: day, month and year, each number followed by one separator.
+bool parseHeaderDate(const char*& pos, const char* end, DataFileHeader& header);
+
 }  // namespace orv
