@@ -130,16 +130,15 @@ bool RecordStatistics::stepGeneralStatistics(const LevelRecord& r, const DataFil
 }
 
 void RecordStatistics::writeShortLeqRows(std::uint32_t errorMark) {
-    if (leqOn_) {
-        LeqRow row;
-        row.errorsInInterval = errorMark;
-        row.levels.resize(1);
-        for (const ShortLeqRecord& rec : shortLeqList_) {
-            row.time = rec.time;
-            row.overload = rec.overload;
-            row.levels[0] = rec.leqDb;
-            leqWriter_->writeRow(row);
+    if (leqOn_ && !shortLeqList_.empty()) {
+        std::vector<LeqRow> rows(shortLeqList_.size());
+        for (std::size_t i = 0; i < rows.size(); ++i) {
+            rows[i].time = shortLeqList_[i].time;
+            rows[i].errorsInInterval = errorMark;
+            rows[i].overload = shortLeqList_[i].overload;
+            rows[i].levels.assign(1, shortLeqList_[i].leqDb);
         }
+        leqWriter_->writeRows(rows);
     }
     shortLeqList_.clear();
 }

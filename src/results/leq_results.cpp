@@ -87,17 +87,38 @@ std::string LeqResultsWriter::formatRow(const LeqRow& row) {
     return b.str();
 }
 
-bool LeqResultsWriter::writeRow(const LeqRow& row) {
-    if (row.levels.empty()) return false;
-    const LeqFileKind kind = row.levels.size() == 1 ? LeqFileKind::AllPass : LeqFileKind::Octave;
-    const std::string line = formatRow(row);
+bool LeqResultsWriter::writeRow(const LeqRow& row) { return writeRows({row}); }
+
+bool LeqResultsWriter::writeRows(const std::vector<LeqRow>& rows) {
+    std::array<std::string, 2> pending;
+    bool all = true;
     std::lock_guard<std::mutex> lock(mutex_);
+    for (const LeqRow& row : rows) {
+        if (row.levels.empty()) {  // written nowhere
+            all = false;
+            continue;
+        }
+        const LeqFileKind kind = row.levels.size() == 1 ? LeqFileKind::AllPass : LeqFileKind::Octave;
+        const std::string line = formatRow(row);
+        all = addLineLocked(kind, line, pending[static_cast<std::size_t>(kind)]) && all;
+    }
+    for (std::size_t k = 0; k < 2; ++k) {
+        LeqFile& f = files_[k];
+        if (pending[k].empty()) continue;
+        if (!f.handle.valid() || f.handle.write(pending[k]) != pending[k].size()) all = false;
+    }
+    return all;
+}
+
+bool LeqResultsWriter::addLineLocked(LeqFileKind kind, const std::string& line, std::string& pending) {
     LeqFile& f = file(kind);
     if (f.name.empty()) return false;  // that file was never opened in this session
-    bool written = false;
-    if (f.handle.valid()) written = f.handle.write(line) == line.size();
-    ++f.lines;
-    if (f.lines >= linesPerPart_) rollOverLocked(kind);
+    pending += line;
+    // The line counts whether or not it reaches the file.
+    if (++f.lines < linesPerPart_) return f.handle.valid();
+    const bool written = f.handle.valid() && f.handle.write(pending) == pending.size();
+    pending.clear();
+    rollOverLocked(kind);
     return written;
 }
 

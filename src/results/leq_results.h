@@ -46,6 +46,9 @@ public:
     // Writes one row to the file its level count selects; rolls over to a new part when the
     // current one is full. True when the row was written in full.
     bool writeRow(const LeqRow& row);
+    // Several rows, written with as few writes as the roll-over allows. True when every
+    // row was written in full.
+    bool writeRows(const std::vector<LeqRow>& rows);
 
     static std::string formatRow(const LeqRow& row);
     std::uint32_t lineCount(LeqFileKind kind) const { return file(kind).lines; }
@@ -62,6 +65,8 @@ private:
     LeqFile& file(LeqFileKind kind) { return files_[static_cast<std::size_t>(kind)]; }
     const LeqFile& file(LeqFileKind kind) const { return files_[static_cast<std::size_t>(kind)]; }
     bool writeColumnHeaderLocked(LeqFileKind kind);
+    // Appends a row's line to `pending`, writing it out and rolling over when the part is full.
+    bool addLineLocked(LeqFileKind kind, const std::string& line, std::string& pending);
     void rollOverLocked(LeqFileKind kind);
 
     platform::Console& out_;
