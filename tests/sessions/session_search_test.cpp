@@ -12,44 +12,13 @@ namespace {
 
 using testing_support::namedSession;
 using testing_support::SessionSpec;
-using testing_support::TempDir;
-using testing_support::writeFile;
-using testing_support::writeSession;
 using Strings = std::vector<std::string>;
-
-struct SearchResult {
-    std::uint32_t found = 0;
-    std::string out;
-    orv::SessionTable table;
-
-    Strings paths() const {
-        Strings p;
-        for (const auto& e : table.entries)
-            p.push_back(e.sessionPath);
-        return p;
-    }
-};
-
-SearchResult search(const Strings& paths, bool recursive = false, bool needWave = false,
-                    orv::SessionTable table = {}) {
-    SearchResult r;
-    r.table = std::move(table);
-    orv::ProcessingSettings settings;
-    settings.recursiveSearch = recursive ? 1 : 0;
-    settings.needWaveFiles = needWave ? 1 : 0;
-    orv::SearchPathList list;
-    list.paths = paths;
-    platform::Console console(&r.out);
-    r.found = orv::findSessions(list, settings, r.table, console);
-    return r;
-}
 
 std::string real(const std::string& path) {
     std::string out;
     platform::canonicalDirectory(path, out);
     return out;
 }
-
 std::string added(const std::string& name) {
     return "MSG: Added - \"" + name + "\".\r\n";
 }
@@ -57,109 +26,111 @@ std::string duplicate(const std::string& name) {
     return "MSG: Duplicate Session Found - \"" + name + "\". Using first instance\r\n";
 }
 
-class SessionSearchTest : public ::testing::Test {
+class SearchTest : public ::testing::Test {
   protected:
-    TempDir tmp;
+    testing_support::TempDir tmp;
     std::string root = real(tmp.path());
+    orv::SessionTable table;
+    std::string out;
 
     std::string session(const std::string& rel, const SessionSpec& spec) {
-        return writeSession(root + "/" + rel, spec);
+        return testing_support::writeSession(root + "/" + rel, spec);
     }
     std::string session(const std::string& rel) {
         return session(rel, namedSession(rel.substr(rel.find_last_of('/') + 1)));
     }
+    // Runs a search over a copy of `table`; returns what it printed.
+    std::string search(const Strings& paths, bool recursive = false, bool needWave = false) {
+        orv::ProcessingSettings settings;
+        settings.recursiveSearch = recursive ? 1 : 0;
+        settings.needWaveFiles = needWave ? 1 : 0;
+        orv::SearchPathList list{paths};
+        out.clear();
+        platform::Console console(&out);
+        found = table;
+        const std::uint32_t count = orv::findSessions(list, settings, found, console);
+        EXPECT_EQ(count, found.count());
+        return out;
+    }
+    Strings paths() const {
+        Strings p;
+        for (const auto& e : found.entries)
+            p.push_back(e.sessionPath);
+        return p;
+    }
+    orv::SessionTable found;
 };
 
-TEST_F(SessionSearchTest, SubdirectorySessionsInListingOrderWithSortedFileLists) {
+TEST_F(SearchTest, SubdirectorySessionsInListingOrderWithSortedFileLists) {
     SessionSpec spec = namedSession("b");
     spec.levelFiles[0].name = "c.csv";
     spec.levelFiles.push_back({"data.000", "A.CSV", {}, {}});
     spec.levelFiles.push_back({"data.001", "b.csv", {}, {}});
     spec.levelFiles.push_back({"data", "z.csv", {}, {}});
     spec.levelFiles.push_back({"other", "x.csv", {}, {}});  // not a data directory
-    spec.extraDirs = {"data.000/dir.csv"};                  // a directory is not a file
+    spec.extraDirs = {"data.000/dir.csv"};                  // not a file
     spec.waveFiles = {"data.001/2.wav", "data.000/1.WAV"};
     session("b", spec);
     session("a");
     session("C");
-    writeFile(root + "/loose.csv", "");
-
-    SearchResult r = search({root});
-    EXPECT_EQ(r.out, added("C") + added("a") + added("b"));
-    EXPECT_EQ(r.found, 3U);
-    EXPECT_EQ(r.paths(), (Strings{root + "/C/", root + "/a/", root + "/b/"}));
-    EXPECT_EQ(r.table.entries[2].dataFiles,
+    EXPECT_EQ(search({root}), added("C") + added("a") + added("b"));
+    EXPECT_EQ(paths(), (Strings{root + "/C/", root + "/a/", root + "/b/"}));
+    EXPECT_EQ(found.entries[2].dataFiles,
               (Strings{"data.000/A.CSV", "data.000/c.csv", "data.001/b.csv", "data/z.csv"}));
-    EXPECT_TRUE(r.table.entries[2].waveFiles.empty());
-    EXPECT_EQ(r.table.entries[2].sessionName, "b");
-
-    r = search({root}, false, true);
-    EXPECT_EQ(r.table.entries[2].waveFiles, (Strings{"data.000/1.WAV", "data.001/2.wav"}));
+    EXPECT_TRUE(found.entries[2].waveFiles.empty());
+    search({root}, false, true);
+    EXPECT_EQ(found.entries[2].waveFiles, (Strings{"data.000/1.WAV", "data.001/2.wav"}));
 }
 
-TEST_F(SessionSearchTest, CandidatesThatAreNotSessions) {
-    SessionSpec onlyData001 = namedSession("n1");
-    onlyData001.levelFiles[0].dataDir = "data.001";
-    session("n1", onlyData001);
-    SessionSpec noInfo = namedSession("n2");
+TEST_F(SearchTest, CandidatesThatAreNotSessions) {
+    SessionSpec data001 = namedSession("n1"), noInfo = data001, noCsv = data001, upper = data001;
+    data001.levelFiles[0].dataDir = "data.001";
     noInfo.writeInfo = false;
-    session("n2", noInfo);
-    SessionSpec noCsv = namedSession("n3");
     noCsv.levelFiles[0].name = "hour.txt";
     noCsv.waveFiles = {"data.000/x.wav"};
+    upper.levelFiles[0].dataDir = "DATA.000";
+    session("n1", data001);
+    session("n2", noInfo);
     session("n3", noCsv);
-    SessionSpec upperData = namedSession("n4");
-    upperData.levelFiles[0].dataDir = "DATA.000";
-    session("n4", upperData);
+    session("n4", upper);
     // Session paths of 259 characters fit, 260 do not.
     const std::string parent = std::string(246 - root.size(), 'd');
     session(parent + "/longsession");
     session(parent + "/longsessio");
-    ASSERT_EQ((root + "/" + parent + "/longsession/").size(), 260U);
-    const SearchResult r = search({root, root + "/" + parent}, false, true);
-    EXPECT_EQ(r.out, added("longsessio"));
+    EXPECT_EQ(search({root, root + "/" + parent}, false, true), added("longsessio"));
 }
 
-TEST_F(SessionSearchTest, DataFilesInAnyDataDirectoryCount) {
+// As with data.000, a session's files may be in any of its data directories.
+TEST_F(SearchTest, DataFilesInAnyDataDirectoryCount) {
     SessionSpec spec = namedSession("S");
-    spec.levelFiles[0].dataDir = "data.000";
     spec.waveFiles = {"data.000/b.wav", "data.001/a.wav"};
-    spec.extraDirs = {"data.002"};  // the last data directory holds nothing
+    spec.extraDirs = {"data.002"};
     session("S", spec);
-    const SearchResult r = search({root}, false, true);
-    ASSERT_EQ(r.found, 1U);
-    EXPECT_EQ(r.table.entries[0].waveFiles, (Strings{"data.000/b.wav", "data.001/a.wav"}));
+    search({root}, false, true);
+    ASSERT_EQ(found.count(), 1U);
+    EXPECT_EQ(found.entries[0].waveFiles, (Strings{"data.000/b.wav", "data.001/a.wav"}));
 }
 
-TEST_F(SessionSearchTest, NestedSessionsOnlyWithRecursion) {
+TEST_F(SearchTest, NestedSessionsOnlyWithRecursionAndNoLinkLoops) {
     session("group/S1");
     session("group/S1/inner/S2");
     session("S0");
-    EXPECT_EQ(search({root}).out, added("S0"));
-    const SearchResult r = search({root}, true);
-    EXPECT_EQ(r.out, added("S0") + added("S1") + added("S2"));
-    EXPECT_EQ(r.paths(),
-              (Strings{root + "/S0/", root + "/group/S1/", root + "/group/S1/inner/S2/"}));
-}
-
-TEST_F(SessionSearchTest, RecursionFollowsLinksButNotLoops) {
-    session("S1");
-    TempDir other;
-    writeSession(other / "S2", namedSession("S2"));
+    testing_support::TempDir other;
+    testing_support::writeSession(other / "S3", namedSession("S3"));
     ASSERT_EQ(::symlink(root.c_str(), (root + "/loop").c_str()), 0);
-    ASSERT_EQ(::symlink(other.path().c_str(), (root + "/elsewhere").c_str()), 0);
-    const SearchResult r = search({root}, true);
-    EXPECT_EQ(r.out, added("S1") + added("S2"));
-    EXPECT_EQ(r.paths(), (Strings{root + "/S1/", real(other.path()) + "/S2/"}));
+    ASSERT_EQ(::symlink(other.path().c_str(), (root + "/link").c_str()), 0);
+    EXPECT_EQ(search({root}), added("S0"));
+    EXPECT_EQ(search({root}, true), added("S0") + added("S1") + added("S2") + added("S3"));
+    EXPECT_EQ(paths(), (Strings{root + "/S0/", root + "/group/S1/", root + "/group/S1/inner/S2/",
+                                real(other.path()) + "/S3/"}));
 }
 
-TEST_F(SessionSearchTest, SearchPathThatIsItselfASession) {
+TEST_F(SearchTest, SearchPathThatIsItselfASession) {
     testing_support::CurrentDirGuard guard;
     session("top");
     ASSERT_TRUE(platform::setCurrentDirectory(root));
-    const SearchResult r = search({"top", root + "/top/"});
-    EXPECT_EQ(r.out, added("top") + duplicate(root + "/top/"));
-    EXPECT_EQ(r.paths(), Strings{"top/"});
+    EXPECT_EQ(search({"top", root + "/top/"}), added("top") + duplicate(root + "/top/"));
+    EXPECT_EQ(paths(), Strings{"top/"});
     std::string cwd;
     ASSERT_TRUE(platform::getCurrentDirectory(cwd));
     EXPECT_EQ(cwd, root);
@@ -167,59 +138,48 @@ TEST_F(SessionSearchTest, SearchPathThatIsItselfASession) {
 
 // The scan's result is its last candidate's: a search path that is a session and holds
 // sessions is itself added only when the last of them was refused.
-TEST_F(SessionSearchTest, LastCandidateDecidesWhetherTheSearchPathIsTested) {
+TEST_F(SearchTest, LastCandidateDecidesWhetherTheSearchPathIsTested) {
     session("P");
     session("P/A");
-    EXPECT_EQ(search({root + "/P"}).out, added("A"));
+    EXPECT_EQ(search({root + "/P"}), added("A"));
     SessionSpec refused = namedSession("Z");
     refused.writeInfo = false;
     session("P/Z", refused);
-    EXPECT_EQ(search({root + "/P"}).out, added("A") + added(root + "/P"));
+    EXPECT_EQ(search({root + "/P"}), added("A") + added(root + "/P"));
 }
 
-TEST_F(SessionSearchTest, DuplicatesCompareWholeDirectories) {
+TEST_F(SearchTest, DuplicatesCompareWholeDirectories) {
     session("x/S1");
     session("x/S10");
-    // A path that is a leading part of an accepted one is a different session.
-    SearchResult r = search({root + "/x/S10", root + "/x/S1"});
-    EXPECT_EQ(r.out, added(root + "/x/S10") + added(root + "/x/S1"));
-    // Reached through its parent and given directly, in either order.
-    r = search({root + "/x", root + "/x/./S1/"});
-    EXPECT_EQ(r.out, added("S1") + added("S10") + duplicate(root + "/x/./S1/"));
-    SessionSpec renamed = namedSession("not the directory name");
+    const std::string x = root + "/x";
+    EXPECT_EQ(search({x + "/S10", x + "/S1"}), added(x + "/S10") + added(x + "/S1"));
+    EXPECT_EQ(search({x, x + "/./S1/"}), added("S1") + added("S10") + duplicate(x + "/./S1/"));
+    const SessionSpec renamed = namedSession("not the directory name");
     session("y/S2", renamed);
-    r = search({root + "/y/S2", root + "/y"});
-    EXPECT_EQ(r.out, added(root + "/y/S2") + duplicate("S2"));
+    EXPECT_EQ(search({root + "/y/S2", root + "/y"}), added(root + "/y/S2") + duplicate("S2"));
     // A subdirectory named like an accepted session is a duplicate whatever it holds.
     session("z/S10", renamed);
-    r = search({root + "/x", root + "/z"});
-    EXPECT_EQ(r.out, added("S1") + added("S10") + duplicate("S10"));
+    EXPECT_EQ(search({x, root + "/z"}), added("S1") + added("S10") + duplicate("S10"));
 }
 
-TEST_F(SessionSearchTest, TableLimitRefusesFurtherSessions) {
-    orv::SessionTable full;
-    full.entries.resize(orv::SessionTable::kCapacity);
-    full.entries[5].sessionName = "S1";
+TEST_F(SearchTest, TableLimitRefusesFurtherSessions) {
+    table.entries.resize(orv::SessionTable::kCapacity);
+    table.entries[5].sessionName = "S1";
     session("S1");
     session("S2");
     session("S3");
-    const SearchResult r = search({root}, false, false, std::move(full));
-    EXPECT_EQ(r.found, 1024U);
-    EXPECT_EQ(r.out, duplicate("S1") + "MSG: Session limit reached - \"S2\" not added.\r\n" +
-                         "MSG: Session limit reached - \"S3\" not added.\r\n");
+    EXPECT_EQ(search({root}), duplicate("S1") +
+                                  "MSG: Session limit reached - \"S2\" not added.\r\n"
+                                  "MSG: Session limit reached - \"S3\" not added.\r\n");
+    EXPECT_EQ(found.count(), 1024U);
 }
 
-TEST(SessionPaths, BuiltWithOneSeparator) {
-    EXPECT_EQ(orv::buildSessionPath("S1", false, "/"), "/S1/");
+TEST(SessionSearchParts, PathsAndFileOrder) {
+    EXPECT_EQ(orv::buildSessionPath("S1", false, "/"), "/S1/");  // a root parent
     EXPECT_EQ(orv::buildSessionPath("S1", false, "/data"), "/data/S1/");
-    EXPECT_EQ(orv::buildSessionPath("rel/S1", true, ""), "rel/S1/");
-    EXPECT_EQ(orv::buildSessionPath("/", true, ""), "/");
-}
-
-TEST(FileLists, ComparePrefixAndByteOrder) {
+    EXPECT_EQ(orv::buildSessionPath("rel/S1/", true, ""), "rel/S1/");
     EXPECT_EQ(orv::comparePrefix("data", "data.000"), 0);
     EXPECT_GT(orv::comparePrefix("data.000", "data"), 0);
-    EXPECT_LT(orv::comparePrefix("a", "b"), 0);
     EXPECT_GT(orv::comparePrefix("\xe9", "z"), 0);  // bytes compare unsigned
     Strings list{"data/a.csv", "data.000/b.csv.csv", "data.000/b.csv", "data.000/B.csv"};
     orv::sortFileList(list);
@@ -228,19 +188,16 @@ TEST(FileLists, ComparePrefixAndByteOrder) {
 }
 
 TEST(SessionSearchRun, RelativeSearchPathAndFoundCount) {
-    TempDir tmp;
+    testing_support::TempDir tmp;
     testing_support::CurrentDirGuard guard;
-    writeSession(tmp / "sessions/S1", namedSession("S1"));
-    writeSession(tmp / "sessions/S2", namedSession("S2"));
+    testing_support::writeSession(tmp / "sessions/S1", namedSession("S1"));
+    testing_support::writeSession(tmp / "sessions/S2", namedSession("S2"));
     ASSERT_TRUE(platform::setCurrentDirectory(tmp.path()));
     const auto r = testing_support::runTool({"-s", "sessions", "-d", "out"});
     EXPECT_NE(r.output.find("Finding Sessions...\r\n" + added("S1") + added("S2") +
                             "Found 2 Session(s)\r\n"),
               std::string::npos)
         << r.output;
-    std::string cwd;
-    ASSERT_TRUE(platform::getCurrentDirectory(cwd));
-    EXPECT_EQ(cwd, real(tmp.path()));
 }
 
 }  // namespace
