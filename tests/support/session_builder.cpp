@@ -50,6 +50,10 @@ std::string infoFileText(const InfoFields& f) {
     return text;
 }
 
+void writeInfoFile(const std::string& path, const InfoFields& fields) {
+    writeFile(path, infoFileText(fields));
+}
+
 std::vector<LevelRow> makeRows(std::size_t count, std::size_t firstSlot,
                                const std::function<void(std::size_t slot, LevelRow&)>& fill) {
     std::vector<LevelRow> rows(count);
@@ -87,6 +91,11 @@ std::string levelFileName(const LevelFileHeader& h) {
     return format("%04u%02u%02u_%02u.csv", h.year, h.month, h.day, h.hour);
 }
 
+void writeLevelFile(const std::string& path, const LevelFileHeader& header,
+                    const std::vector<LevelRow>& rows) {
+    writeFile(path, levelFileText(header, rows));
+}
+
 SessionSpec namedSession(const std::string& name) {
     SessionSpec spec;
     spec.info.sessionName = name;
@@ -100,11 +109,11 @@ std::string writeSession(const std::string& dir, const SessionSpec& spec) {
     if (spec.writeInfo) {
         std::string infName = spec.infName;
         if (infName.empty()) infName = dir.substr(dir.find_last_of('/') + 1) + ".inf";
-        writeFile(dir + "/" + infName, infoFileText(spec.info));
+        writeInfoFile(dir + "/" + infName, spec.info);
     }
     for (const LevelFileSpec& file : spec.levelFiles) {
         const std::string name = file.name.empty() ? levelFileName(file.header) : file.name;
-        writeFile(dir + "/" + file.dataDir + "/" + name, levelFileText(file.header, file.rows));
+        writeLevelFile(dir + "/" + file.dataDir + "/" + name, file.header, file.rows);
     }
     for (const std::string& wave : spec.waveFiles)
         writeFile(dir + "/" + wave, "");

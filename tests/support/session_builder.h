@@ -31,6 +31,7 @@ struct InfoFields {
 // "KEY: value" lines with CR LF ends, in the order of the fields above.
 std::string infoFileText(const InfoFields& fields);
 std::string formatInfoDateTime(const InfoDateTime& t);  // "dd/mm/yyyy hh:mm:ss"
+void writeInfoFile(const std::string& path, const InfoFields& fields);
 
 struct LevelFileHeader {
     std::string sessionTitle = "Session1";
@@ -59,6 +60,8 @@ std::vector<LevelRow> makeHour(const std::function<void(std::size_t slot, LevelR
 std::string levelFileText(const LevelFileHeader& header, const std::vector<LevelRow>& rows);
 // The logger's file name for the header's hour: yyyymmdd_hh.csv.
 std::string levelFileName(const LevelFileHeader& header);
+void writeLevelFile(const std::string& path, const LevelFileHeader& header,
+                    const std::vector<LevelRow>& rows);
 
 struct LevelFileSpec {
     std::string dataDir = "data.000";
