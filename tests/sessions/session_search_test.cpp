@@ -103,12 +103,13 @@ TEST_F(SearchTest, CandidatesThatAreNotSessions) {
 // As with data.000, a session's files may be in any of its data directories.
 TEST_F(SearchTest, DataFilesInAnyDataDirectoryCount) {
     SessionSpec spec = namedSession("S");
-    spec.waveFiles = {"data.000/b.wav", "data.001/a.wav"};
-    spec.extraDirs = {"data.002"};
+    spec.waveFiles = {"data/a.wav", "data.000/b.wav", "data.001/c.wav"};
+    spec.extraDirs = {"data.002"};  // visited last, holding nothing
     session("S", spec);
     search({root}, false, true);
     ASSERT_EQ(found.count(), 1U);
-    EXPECT_EQ(found.entries[0].waveFiles, (Strings{"data.000/b.wav", "data.001/a.wav"}));
+    EXPECT_EQ(found.entries[0].waveFiles,
+              (Strings{"data.000/b.wav", "data.001/c.wav", "data/a.wav"}));
 }
 
 TEST_F(SearchTest, NestedSessionsOnlyWithRecursionAndNoLinkLoops) {
