@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <sstream>
+#include <thread>
+
 #include "results/general_results.h"
 #include "results/leq_results.h"
 #include "results/result_files.h"
@@ -198,6 +201,54 @@ TEST(LeqResults, RollsOverIntoNumberedPartsWithTheSameHeader) {
     EXPECT_NE(third.find("'12:00:08.0"), std::string::npos);
     EXPECT_EQ(console, "");
     EXPECT_EQ(orv::ResultNaming::leqPart("/o/S1_LEQ3OCT.csv", 12), "/o/S1_LEQ3OCT_12.csv");
+}
+
+TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
+    TempDir dir;
+    std::string console;
+    platform::Console out(&console);
+    orv::LeqResultsWriter writer(out, 121);  // 100 rows per part
+    orv::ResultHeaderInfo info = sampleInfo();
+    for (auto kind : {orv::LeqFileKind::AllPass, orv::LeqFileKind::Octave}) {
+        ASSERT_TRUE(writer.open(kind, dir / (kind == orv::LeqFileKind::AllPass ? "a.csv" : "o.csv")));
+        ASSERT_TRUE(writer.formatHeader(kind, info, 12));
+        ASSERT_TRUE(writer.writeColumnHeader(kind));
+    }
+    auto produce = [&](std::size_t levels, int count) {
+        for (int i = 0; i < count; i += 5) {
+            std::vector<orv::LeqRow> batch(5);
+            for (auto& row : batch) {
+                row.time = {2021, 1, 0, 2, 12, 0, 0, 0};
+                row.levels.assign(levels, 42.0F);
+            }
+            ASSERT_TRUE(writer.writeRows(batch));
+        }
+    };
+    std::thread octave(produce, 12, 450);
+    produce(1, 450);
+    octave.join();
+    writer.close(orv::LeqFileKind::AllPass);
+    writer.close(orv::LeqFileKind::Octave);
+    for (const char* base : {"a", "o"}) {
+        std::size_t rowsSeen = 0;
+        for (int part = 0; part < 5; ++part) {
+            const std::string name = part == 0 ? dir / (std::string(base) + ".csv")
+                                               : dir / (std::string(base) + "_" + std::to_string(part) + ".csv");
+            const std::string text = readFile(name);
+            std::istringstream in(text);
+            std::string line;
+            int n = 0;
+            while (std::getline(in, line)) {
+                if (++n > 21) {
+                    ++rowsSeen;
+                    EXPECT_EQ(line.rfind("\"02/01/2021\",\"'12:00:00.0\",\"42.0\",", 0), 0U) << line;
+                    EXPECT_EQ(std::count(line.begin(), line.end(), '"'), base[0] == 'a' ? 8 : 30);
+                }
+            }
+            EXPECT_EQ(n, part < 4 ? 121 : 71) << name;
+        }
+        EXPECT_EQ(rowsSeen, 450U);
+    }
 }
 
 TEST(ResultNames, FlatAndSubDirectoryLayouts) {
