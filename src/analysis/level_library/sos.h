@@ -31,13 +31,9 @@ class SosCascade {
     std::size_t sections() const { return coeffs_.size(); }
 
   private:
-    struct State {
-        double s1 = 0.0;
-        double s2 = 0.0;
-    };
     std::vector<Sos> coeffs_;
-    std::vector<State> state_;
-    bool odd_ = false;  // decimation phase
+    std::vector<std::array<double, 2>> state_;  // s1, s2 per section
+    bool odd_ = false;                          // decimation phase
 };
 
 // Up to kLaneWidth band filters fed with the same input, run side by side: each lane is one

@@ -1,0 +1,283 @@
+#include "band_levels.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+#include <limits>
+
+#include "dsp.h"
+#include "tweight.h"
+
+namespace SlmLibrary {
+namespace {
+
+typedef float F8 __attribute__((vector_size(8 * sizeof(float))));
+typedef float F4 __attribute__((vector_size(4 * sizeof(float))));
+typedef double D4 __attribute__((vector_size(4 * sizeof(double))));
+
+// Settled statistics of eight lanes over `run` frames: energy, peak, exponential time
+// weighting and its extremes. The time weighting is y = (1 - a) y + a p, whose recursion is
+// one fused multiply-add per frame in the x86-64-v3 clone.
+__attribute__((target_clones("arch=x86-64-v3", "default"), optimize("fp-contract=fast"))) void
+settledRun8(const float* frames, std::size_t run, double a, double* energy, double* tw,
+            double* maxima, double* minima, float* peak) {
+    D4 e[2], y[2], mx[2], mn[2];
+    for (std::size_t h = 0; h < 2; ++h) {
+        std::memcpy(&e[h], energy + 4 * h, sizeof(D4));
+        std::memcpy(&y[h], tw + 4 * h, sizeof(D4));
+        std::memcpy(&mx[h], maxima + 4 * h, sizeof(D4));
+        std::memcpy(&mn[h], minima + 4 * h, sizeof(D4));
+    }
+    F8 pk;
+    std::memcpy(&pk, peak, sizeof(F8));
+    const D4 gain = D4{} + a;
+    const D4 keep = D4{} + (1.0 - a);
+    for (std::size_t k = 0; k < run; ++k) {
+        F8 v;
+        std::memcpy(&v, frames + 8 * k, sizeof(F8));
+        const F8 av = v < 0.0F ? -v : v;
+        pk = pk > av ? pk : av;
+        const F4 half[2] = {__builtin_shufflevector(v, v, 0, 1, 2, 3),
+                            __builtin_shufflevector(v, v, 4, 5, 6, 7)};
+        for (std::size_t h = 0; h < 2; ++h) {
+            const D4 d = __builtin_convertvector(half[h], D4);
+            const D4 p = d * d;
+            e[h] += p;
+            y[h] = keep * y[h] + gain * p;
+            mx[h] = mx[h] > y[h] ? mx[h] : y[h];
+            mn[h] = mn[h] < y[h] ? mn[h] : y[h];
+        }
+    }
+    for (std::size_t h = 0; h < 2; ++h) {
+        std::memcpy(energy + 4 * h, &e[h], sizeof(D4));
+        std::memcpy(tw + 4 * h, &y[h], sizeof(D4));
+        std::memcpy(maxima + 4 * h, &mx[h], sizeof(D4));
+        std::memcpy(minima + 4 * h, &mn[h], sizeof(D4));
+    }
+    std::memcpy(peak, &pk, sizeof(F8));
+}
+
+}  // namespace
+
+template <std::size_t W>
+BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
+                          const std::array<LaneSetup, W>& lanes)
+    : code_(twCode), rate_(rate) {
+    const double factor = inputRate / rate;
+    tickSamples_ = static_cast<std::size_t>(std::lround(0.01 * inputRate / factor));
+    periodSamples_ = static_cast<std::size_t>(std::lround(0.1 * inputRate / factor));
+    if (code_ != TWeight::N) alpha_ = -std::expm1(-1.0 / (TWeight::timeConstant(code_) * rate));
+    for (std::size_t l = 0; l < W; ++l) {
+        active_[l] = lanes[l].active;
+        settleEnd_[l] = static_cast<std::uint64_t>(std::ceil(lanes[l].settleSeconds * rate));
+        const auto prime =
+            code_ == TWeight::N
+                ? 0U
+                : static_cast<std::uint64_t>(std::ceil(lanes[l].primeSeconds * rate));
+        primeEnd_[l] = settleEnd_[l] + prime;
+        primeDecay_[l] = std::pow(1.0 - alpha_, static_cast<double>(prime));
+        if (active_[l]) warmEnd_ = std::max(warmEnd_, primeEnd_[l]);
+    }
+    histogram_.reserve(W);
+    for (std::size_t l = 0; l < W; ++l) {
+        histogram_.emplace_back(active_[l] ? LevelHistogram() : LevelHistogram(0.0F, 0.0F));
+    }
+    shortLeqs_.resize(W);
+    reset();
+}
+
+template <std::size_t W>
+void BandLevels<W>::reset() {
+    seen_ = 0;
+    tw_.fill(0.0);
+    primeSum_.fill(0.0);
+    periodSum_.fill(0.0);
+    periodValid_.fill(false);
+    periodPhase_ = 0;
+    resetStatistics();
+}
+
+template <std::size_t W>
+void BandLevels<W>::resetStatistics() {
+    tickPhase_ = 0;
+    count_ = 0;
+    callCount_ = 0;
+    energy_.fill(0.0);
+    callEnergy_.fill(0.0);
+    peak_.fill(0.0F);
+    max_.fill(-std::numeric_limits<double>::infinity());
+    min_.fill(std::numeric_limits<double>::infinity());
+    hasExtremes_.fill(false);
+    for (LevelHistogram& h : histogram_)
+        h.reset();
+    for (std::vector<Leq>& s : shortLeqs_)
+        s.clear();
+    if (code_ == TWeight::N) {
+        // A new statistics interval starts a new 100 ms period.
+        periodPhase_ = 0;
+        periodSum_.fill(0.0);
+    }
+}
+
+template <std::size_t W>
+void BandLevels<W>::tick() {
+    for (std::size_t l = 0; l < W; ++l) {
+        if (active_[l] && seen_ >= primeEnd_[l]) histogram_[l].add(Dsp::powerToDb(tw_[l]));
+    }
+}
+
+template <std::size_t W>
+void BandLevels<W>::process(const float* frames, std::size_t count, bool entering) {
+    if (entering && code_ != TWeight::N && seen_ >= warmEnd_) {
+        processFast(frames, count);
+    } else {
+        // Up to the end of the warm-up sample by sample, then the fast path.
+        std::size_t slow = count;
+        if (entering && code_ != TWeight::N && warmEnd_ - seen_ < count) {
+            slow = static_cast<std::size_t>(warmEnd_ - seen_);
+        }
+        processSlow(frames, slow, entering);
+        if (slow < count) processFast(frames + slow * W, count - slow);
+    }
+}
+
+template <std::size_t W>
+void BandLevels<W>::processFast(const float* frames, std::size_t count) {
+    const double a = alpha_;
+    std::size_t i = 0;
+    while (i < count) {
+        const std::size_t run = std::min(count - i, tickSamples_ - tickPhase_);
+        const float* f = frames + i * W;
+        if constexpr (W == 8) {
+            settledRun8(f, run, a, energy_.data(), tw_.data(), max_.data(), min_.data(),
+                        peak_.data());
+        } else {
+            for (std::size_t k = 0; k < run; ++k) {
+                for (std::size_t l = 0; l < W; ++l) {
+                    const float v = f[k * W + l];
+                    const double p = static_cast<double>(v) * static_cast<double>(v);
+                    energy_[l] += p;
+                    peak_[l] = std::max(peak_[l], std::fabs(v));
+                    tw_[l] += a * (p - tw_[l]);
+                    max_[l] = std::max(max_[l], tw_[l]);
+                    min_[l] = std::min(min_[l], tw_[l]);
+                }
+            }
+        }
+        for (std::size_t l = 0; l < W; ++l)
+            hasExtremes_[l] = hasExtremes_[l] || active_[l];
+        seen_ += run;
+        count_ += run;
+        i += run;
+        tickPhase_ += run;
+        if (tickPhase_ == tickSamples_) {
+            tickPhase_ = 0;
+            tick();
+        }
+    }
+}
+
+template <std::size_t W>
+void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool entering) {
+    for (std::size_t k = 0; k < count; ++k) {
+        for (std::size_t l = 0; l < W; ++l) {
+            if (!active_[l]) continue;
+            const float v = frames[k * W + l];
+            const double p = static_cast<double>(v) * static_cast<double>(v);
+            if (entering) energy_[l] += p;
+            const bool settledNow = seen_ >= primeEnd_[l];
+            if (code_ == TWeight::N) {
+                if (!entering) continue;
+                // A period counts only when it starts settled.
+                if (periodPhase_ == 0) periodValid_[l] = seen_ >= settleEnd_[l];
+                if (seen_ >= settleEnd_[l]) peak_[l] = std::max(peak_[l], std::fabs(v));
+                periodSum_[l] += p;
+                continue;
+            }
+            if (seen_ < settleEnd_[l]) continue;
+            tw_[l] += alpha_ * (p - tw_[l]);
+            if (!settledNow) {
+                primeSum_[l] += p;
+                if (seen_ + 1 == primeEnd_[l]) {
+                    const double samples = static_cast<double>(primeEnd_[l] - settleEnd_[l]);
+                    tw_[l] += primeDecay_[l] * primeSum_[l] / samples;
+                }
+                continue;
+            }
+            if (entering) {
+                peak_[l] = std::max(peak_[l], std::fabs(v));
+                max_[l] = std::max(max_[l], tw_[l]);
+                min_[l] = std::min(min_[l], tw_[l]);
+                hasExtremes_[l] = true;
+            }
+        }
+        ++seen_;
+        if (!entering) continue;
+        ++count_;
+        if (code_ == TWeight::N) {
+            if (++periodPhase_ == periodSamples_) {
+                periodPhase_ = 0;
+                for (std::size_t l = 0; l < W; ++l) {
+                    if (!active_[l]) continue;
+                    if (periodValid_[l]) {
+                        const double level = periodSum_[l] / static_cast<double>(periodSamples_);
+                        max_[l] = std::max(max_[l], level);
+                        min_[l] = std::min(min_[l], level);
+                        hasExtremes_[l] = true;
+                        histogram_[l].add(Dsp::powerToDb(level));
+                    }
+                    periodSum_[l] = 0.0;
+                }
+            }
+        } else if (++tickPhase_ == tickSamples_) {
+            tickPhase_ = 0;
+            tick();
+        }
+    }
+}
+
+template <std::size_t W>
+void BandLevels<W>::beginCall() {
+    callCount_ = count_;
+    callEnergy_ = energy_;
+}
+
+template <std::size_t W>
+void BandLevels<W>::endCall() {
+    const double samples = static_cast<double>(count_ - callCount_);
+    for (std::size_t l = 0; l < W; ++l) {
+        if (!active_[l]) continue;
+        // energy = mean square x duration, duration in seconds.
+        shortLeqs_[l].emplace_back((energy_[l] - callEnergy_[l]) / rate_, samples / rate_);
+    }
+}
+
+template <std::size_t W>
+bool BandLevels<W>::settled(std::size_t lane) const {
+    return seen_ >= primeEnd_[lane];
+}
+
+template <std::size_t W>
+double BandLevels<W>::leqPower(std::size_t lane) const {
+    if (count_ == 0) return std::numeric_limits<double>::quiet_NaN();
+    return energy_[lane] / static_cast<double>(count_);
+}
+
+template <std::size_t W>
+bool BandLevels<W>::extremes(std::size_t lane, double& minPower, double& maxPower) const {
+    if (!hasExtremes_[lane]) return false;
+    minPower = min_[lane];
+    maxPower = max_[lane];
+    return true;
+}
+
+template <std::size_t W>
+void BandLevels<W>::percentiles(std::size_t lane, const std::vector<float>& percents,
+                                float* out) const {
+    histogram_[lane].exceedanceLevels(percents.data(), percents.size(), out);
+}
+
+template class BandLevels<1>;
+template class BandLevels<8>;
+
+}  // namespace SlmLibrary

@@ -1,0 +1,112 @@
+// Levels and statistics of up to W band signals of one rate, side by side: squaring,
+// time weighting, warm-up, and the statistics of one meter channel per lane.
+//
+// Per lane, over the samples entered since the statistics were reset:
+// - Leq: mean square of every entered sample;
+// - Lmax, Lmin: extremes of the time-weighted mean square over every lane sample (N: over
+//   the 100 ms equivalent levels);
+// - Ln: exceedance levels from a histogram of 0.1 dB classes of the time-weighted level
+//   taken every 10 ms of entered audio (100 per second; N: each 100 ms level once, which
+//   is the same distribution);
+// - Lpeak: largest absolute sample value;
+// - short Leqs: one Leq per call that asks for it (beginCall / endCall).
+//
+// Warm-up. A lane counts every sample it is given, pre-roll included, from reset. For its
+// first settleSamples the filters ahead of it are still settling: the time weighting is
+// idle. For the next primeSamples it runs from zero while the mean square m of those
+// samples is collected; then m * (1 - alpha)^primeSamples is added to its state, which is
+// exactly the result of starting the average at m instead of zero. From then on the lane
+// is settled. Only settled samples enter Lmax, Lmin, Ln and Lpeak; every entered sample
+// enters Leq and the short Leqs. N has no priming: a 100 ms period counts only when it
+// starts settled.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <vector>
+
+#include "leq.h"
+#include "level_histogram.h"
+
+namespace SlmLibrary {
+
+template <std::size_t W>
+class BandLevels {
+  public:
+    struct LaneSetup {
+        bool active = false;
+        double settleSeconds = 0.0;
+        double primeSeconds = 0.0;
+    };
+
+    BandLevels() = default;
+    // twCode: TWeight code (N, F or S); rate: lane sample rate (Hz, with 480 and 4800 input
+    // samples at 48000 Hz whole numbers of lane samples).
+    BandLevels(unsigned twCode, double rate, double inputRate,
+               const std::array<LaneSetup, W>& lanes);
+
+    // Everything back to the start: filters are reset by the owner at the same time.
+    void reset();
+    // Statistics and short Leqs cleared; time weighting and warm-up carry on.
+    void resetStatistics();
+
+    // count frames of W floats (lane-interleaved). entering false: pre-roll, runs the time
+    // weighting and the warm-up only.
+    void process(const float* frames, std::size_t count, bool entering);
+
+    void beginCall();
+    void endCall();  // appends one short Leq per lane
+
+    bool settled(std::size_t lane) const;
+    double leqPower(std::size_t lane) const;  // NaN when nothing was entered
+    // Extremes as mean squares; false when no settled level was entered.
+    bool extremes(std::size_t lane, double& minPower, double& maxPower) const;
+    float peak(std::size_t lane) const { return peak_[lane]; }
+    void percentiles(std::size_t lane, const std::vector<float>& percents, float* out) const;
+    std::uint64_t levelCount(std::size_t lane) const { return histogram_[lane].count(); }
+    double seconds() const { return static_cast<double>(count_) / rate_; }
+    const std::vector<Leq>& shortLeqs(std::size_t lane) const { return shortLeqs_[lane]; }
+
+  private:
+    void processFast(const float* frames, std::size_t count);
+    void processSlow(const float* frames, std::size_t count, bool entering);
+    void tick();
+
+    unsigned code_ = 0;
+    double rate_ = 1.0;
+    double alpha_ = 0.0;
+    std::size_t tickSamples_ = 1;    // 10 ms
+    std::size_t periodSamples_ = 1;  // 100 ms (N)
+    std::array<bool, W> active_{};
+    std::array<std::uint64_t, W> settleEnd_{};  // first sample after filter settling
+    std::array<std::uint64_t, W> primeEnd_{};   // first settled sample
+    std::array<double, W> primeDecay_{};
+    std::uint64_t warmEnd_ = 0;  // all active lanes settled from here
+
+    // Running state.
+    std::uint64_t seen_ = 0;
+    std::array<double, W> tw_{};
+    std::array<double, W> primeSum_{};
+    std::size_t tickPhase_ = 0;
+    std::size_t periodPhase_ = 0;
+    std::array<double, W> periodSum_{};
+    std::array<bool, W> periodValid_{};
+
+    // Statistics.
+    std::uint64_t count_ = 0;
+    std::array<double, W> energy_{};
+    std::array<float, W> peak_{};
+    std::array<double, W> max_{};
+    std::array<double, W> min_{};
+    std::array<bool, W> hasExtremes_{};
+    std::vector<LevelHistogram> histogram_;
+    std::uint64_t callCount_ = 0;
+    std::array<double, W> callEnergy_{};
+    std::vector<std::vector<Leq>> shortLeqs_;
+};
+
+extern template class BandLevels<1>;
+extern template class BandLevels<8>;
+
+}  // namespace SlmLibrary

@@ -1,0 +1,175 @@
+// The sound level meter: frequency weighting, an octave or third-octave bank and one
+// filtered channel, each band with its own time weighting and statistics.
+//
+// Use (one meter per block of audio; meters share nothing mutable, so several can run on
+// different threads):
+//   Slm slm(48000, 1, 48000);
+//   slm.initThirdOct(TWeight::F, FWeight::A, 0, 35, 48000, 0);   // or initFullOct(.., 0, 11, ..)
+//   slm.initAuxCh(3, corners, TWeight::F, FWeight::Z, 48000);     // optional filtered channel
+//   slm.setPercentiles({10, 50, 90});
+//   slm.resetAll();
+//   slm.preRoll(previousAudio, n);     // optional, see below
+//   slm.addSamples(block, n, n / 10, n);   // repeatedly, n <= 48000
+//   slm.getStatistics(band, &leq, &lmin, &lmax, levels, &lpeak, nullptr, nullptr);
+//   slm.getAuxStatistics(&leq, &lmin, &lmax, levels, &lpeak, nullptr, nullptr);
+//
+// Channels. The bank's bands are addressed by their band index (ThirdOctaveBandEnum
+// 0..35 or FullOctaveBandEnum 0..11, low to high, as in the name tables); the filtered
+// channel has its own accessors (getAuxStatistics, getAuxShortLeq). No index is shared
+// between the two.
+//
+// Scale. Levels are 10 log10 of mean squares of the float samples (dB re 1); preCondition
+// turns 16-bit samples into calibrated floats.
+//
+// Statistics per channel, over every sample entered with addSamples since resetAll (or
+// resetStatistics): Leq (energy mean); Lmax and Lmin, the extremes of the time-weighted
+// level over every output sample of the band (bands run at 48000 / 2^s Hz, see
+// octave_filter.h; N: over the 100 ms equivalent levels); Ln, the level exceeded for n % of
+// the time, from a histogram of 0.1 dB classes of the time-weighted level taken every 10 ms
+// (100 per second); Lpeak, 20 log10 of the largest absolute value of the weighted, filtered
+// signal at the band's rate. A level with no entry reads 0.0 dB.
+//
+// Short Leqs. Every addSamples call with a non-zero last argument appends, for every band
+// and the filtered channel, a Leq of exactly that call's samples (energy = mean square x
+// seconds). For bands at a decimated rate "that call's samples" are the band samples that
+// the call completed, which are exactly its own when n is a multiple of 32 (every whole
+// number of 100 ms periods is).
+//
+// Start-up. Each channel has a warm-up (band_levels.h): its filters first settle (40 dB
+// decay of the slowest pole on the way: frequency weighting, anti-alias stages, band
+// filter; 3.4 s for the 6.3 Hz third-octave band, 1.1 s for the 8 Hz octave band, below
+// 0.3 s above 80 Hz), then the time weighting is primed with the mean square of a window of
+// max(tau, 2 / fm) seconds (N: no priming). Levels of the warm-up are left out of Lmax,
+// Lmin, Ln and Lpeak but counted in Leq and the short Leqs; settlingSeconds(band) tells how
+// long it is. So a first block of a recording starts without start-up artefacts.
+// Pre-roll: audio that precedes the block, given to preRoll before the first addSamples,
+// runs through the filters, the time weightings and the warm-up without entering anything
+// into the statistics or short Leqs; with a pre-roll at least as long as a band's warm-up
+// the band's statistics start with the block's first sample, settled, and a block analysed
+// with pre-roll reads as the same stretch of a continuous analysis. With a shorter
+// pre-roll the rest of the warm-up falls into the block.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <initializer_list>
+#include <memory>
+#include <optional>
+#include <vector>
+
+#include "band_levels.h"
+#include "fweight.h"
+#include "leq.h"
+#include "octave_filter.h"
+#include "sos.h"
+#include "tweight.h"
+
+namespace SlmLibrary {
+
+// Filter type codes of the filtered channel.
+enum SigFilterType : unsigned {
+    kLowPass = 1,
+    kHighPass = 2,
+    kBandPass = 3,
+    kBandStop = 4,
+    kAllPass = 6,
+};
+
+class Slm {
+  public:
+    // sampleRate must be 48000; channels must be 1; maxBlock is the largest n for which
+    // addSamples and preRoll work without splitting (larger calls are split internally).
+    explicit Slm(double sampleRate = 48000.0, unsigned channels = 1, std::size_t maxBlock = 48000);
+    ~Slm();
+    Slm(const Slm&) = delete;
+    Slm& operator=(const Slm&) = delete;
+
+    // Sets up the bank: time weighting tw (N, F, S), frequency weighting fw (Z, A, C) ahead
+    // of it, bands first..last (inclusive). `reserved` must be 0. Throws
+    // std::invalid_argument with the reason on a refused value; std::bad_alloc may escape.
+    void initFullOct(unsigned tw, unsigned fw, unsigned first, unsigned last, double sampleRate,
+                     unsigned reserved);
+    void initThirdOct(unsigned tw, unsigned fw, unsigned first, unsigned last, double sampleRate,
+                      unsigned reserved);
+    // Filtered channel: Butterworth, 4th order per edge (24 dB/octave), -3 dB at the corners:
+    // low-pass (corners[0]), high-pass (corners[0]), band-pass and band-stop
+    // (corners[0]..corners[1]), all-pass (no filter). Own weightings. Throws
+    // std::invalid_argument.
+    void initAuxCh(unsigned filterType, const float corners[2], unsigned tw, unsigned fw,
+                   double sampleRate);
+
+    // Percentiles n of Ln, in output order (fractions allowed).
+    void setPercentiles(const std::vector<float>& percents);
+    void setPercentiles(const std::vector<std::uint32_t>& percents);
+    void setPercentiles(std::initializer_list<float> percents);
+    std::size_t percentileCount() const { return percents_.size(); }
+
+    // Filters, time weightings, warm-up, statistics and short Leqs back to the start.
+    void resetAll();
+    // Statistics and short Leqs cleared; filters, time weightings and warm-up carry on
+    // (consecutive intervals of one continuous analysis).
+    void resetStatistics();
+
+    // x = s * calibrationGain * (marks[k] != 0 ? rangeMultiplier : 1) for the samples of
+    // period k (4800 samples); a rangeMultiplier <= 0 counts as 1; marks may be null.
+    static void preCondition(const std::int16_t* in, float* out, const std::uint32_t* marks,
+                             std::size_t count, float rangeMultiplier, float calibrationGain);
+
+    // Audio preceding the block, before the first addSamples since resetAll (throws
+    // std::logic_error afterwards). Its first n mod 32 samples are skipped so that the block
+    // starts on the bank's decimation grid. May be called more than once with consecutive
+    // audio whose lengths are multiples of 32.
+    void preRoll(const float* data, std::size_t n);
+    double preRollSeconds() const;
+
+    // Analyses n samples. The third argument is accepted for the callers' convention and
+    // not used (the level rate is fixed, see above). leqSamples != 0: append a short Leq of
+    // this call to every channel.
+    void addSamples(const float* data, std::size_t n, std::size_t unused, std::size_t leqSamples);
+
+    // Bank bands.
+    unsigned firstBand() const { return first_; }
+    unsigned lastBand() const { return last_; }
+    bool hasBank() const { return bank_ != nullptr; }
+    // Statistics of band `band` (any output pointer may be null; levels gets one value per
+    // percentile). Returns false, and writes nothing, for a band that is not set up.
+    bool getStatistics(unsigned band, float* leq, float* lmin, float* lmax, float* levels,
+                       float* lpeak, std::uint64_t* levelCount, double* seconds) const;
+    // Empty for a band that is not set up.
+    const std::vector<Leq>& getShortLeq(unsigned band) const;
+    // Warm-up time of a band (filters settling plus priming), seconds.
+    double settlingSeconds(unsigned band) const;
+
+    // Filtered channel.
+    bool hasAux() const { return aux_ != nullptr; }
+    bool getAuxStatistics(float* leq, float* lmin, float* lmax, float* levels, float* lpeak,
+                          std::uint64_t* levelCount, double* seconds) const;
+    const std::vector<Leq>& getAuxShortLeq() const;
+    double auxSettlingSeconds() const;
+
+  private:
+    struct Bank;
+    struct Aux;
+
+    void initBank(OctaveFilter::Bank kind, unsigned tw, unsigned fw, unsigned first, unsigned last,
+                  double sampleRate, unsigned reserved);
+    void processChunk(const float* data, std::size_t n, bool entering);
+    template <std::size_t W>
+    void readStatistics(const BandLevels<W>& levels, std::size_t lane, float* leq, float* lmin,
+                        float* lmax, float* out, float* lpeak, std::uint64_t* levelCount,
+                        double* seconds) const;
+
+    double fs_;
+    std::size_t maxBlock_;
+    unsigned first_ = 0;
+    unsigned last_ = 0;
+    std::unique_ptr<Bank> bank_;
+    std::unique_ptr<Aux> aux_;
+    std::vector<float> percents_;
+    std::vector<float> weighted_;
+    std::vector<float> auxBuffer_;
+    bool started_ = false;
+    std::size_t preRollSamples_ = 0;
+};
+
+}  // namespace SlmLibrary
