@@ -57,8 +57,8 @@ class SessionRun : public ::testing::Test {
 protected:
     std::string out() const { return dir_ / "out"; }
     std::string sessions() const { return dir_ / "sessions"; }
-    std::string addSession(const SessionSpec& spec, const std::string& dirName) {
-        return writeSession(sessions() + "/" + dirName, spec);
+    std::string addSession(const SessionLayout& layout, const std::string& dirName) {
+        return writeSession(sessions() + "/" + dirName, layout);
     }
     RunResult run(const std::vector<std::string>& options) {
         std::vector<std::string> args{"-s", sessions(), "-d", out()};
@@ -71,9 +71,9 @@ protected:
 };
 
 TEST_F(SessionRun, ConstantLevelsComeBackAsEveryStatistic) {
-    SessionSpec spec = namedSession("Quiet");
-    spec.levelFiles[0].rows = levelRows(1, 1800, [](std::size_t) { return 55.3F; });
-    addSession(spec, "Quiet");
+    SessionLayout layout = namedSession("Quiet");
+    layout.levelFiles[0].rows = levelRows(1, 1800, [](std::size_t) { return 55.3F; });
+    addSession(layout, "Quiet");
     const RunResult r = run({"-i", "1"});
     ASSERT_EQ(r.status, 0) << r.output;
     EXPECT_NE(r.output.find("Found 1 Session(s)\r\n"), std::string::npos);
@@ -95,11 +95,11 @@ TEST_F(SessionRun, ConstantLevelsComeBackAsEveryStatistic) {
 }
 
 TEST_F(SessionRun, MixOfTwoLevelsGivesEnergyMeanAndPercentiles) {
-    SessionSpec spec = namedSession("Mix");
+    SessionLayout layout = namedSession("Mix");
     // One whole 1-minute interval (0:0.1 .. 1:0.0): a quarter of the records at 70 dB.
-    spec.levelFiles[0].rows =
+    layout.levelFiles[0].rows =
         levelRows(1, 600, [](std::size_t slot) { return slot % 4 == 0 ? 70.0F : 50.0F; });
-    addSession(spec, "Mix");
+    addSession(layout, "Mix");
     ASSERT_EQ(run({"-i", "1", "-p", "1", "10", "25", "26", "50", "90"}).status, 0);
     const auto data = rows(result("Mix.csv"));
     ASSERT_EQ(data.size(), 1U);
@@ -120,12 +120,12 @@ TEST_F(SessionRun, MixOfTwoLevelsGivesEnergyMeanAndPercentiles) {
 }
 
 TEST_F(SessionRun, AGapMarksOnlyItsOwnInterval) {
-    SessionSpec spec = namedSession("Gappy");
+    SessionLayout layout = namedSession("Gappy");
     auto all = levelRows(1, 1800, [](std::size_t) { return 60.0F; });
     all.erase(all.begin() + 700);  // a record missing in the second minute
     all.erase(all.begin() + 800);  // and a second gap in the same minute
-    spec.levelFiles[0].rows = all;
-    addSession(spec, "Gappy");
+    layout.levelFiles[0].rows = all;
+    addSession(layout, "Gappy");
     ASSERT_EQ(run({"-i", "1"}).status, 0);
     const auto data = rows(result("Gappy.csv"));
     ASSERT_EQ(data.size(), 3U);
@@ -139,15 +139,15 @@ TEST_F(SessionRun, AGapMarksOnlyItsOwnInterval) {
 }
 
 TEST_F(SessionRun, MissingHourFileIsABreakInTheSequence) {
-    SessionSpec spec = namedSession("Hours");
-    spec.levelFiles[0].header.hour = 8;
-    spec.levelFiles[0].rows = levelRows(35401, 35999, [](std::size_t) { return 50.0F; });
-    LevelFileSpec later;
-    later.header = spec.levelFiles[0].header;
+    SessionLayout layout = namedSession("Hours");
+    layout.levelFiles[0].header.hour = 8;
+    layout.levelFiles[0].rows = levelRows(35401, 35999, [](std::size_t) { return 50.0F; });
+    LevelFileLayout later;
+    later.header = layout.levelFiles[0].header;
     later.header.hour = 10;  // hour 9 was not recorded
     later.rows = levelRows(0, 600, [](std::size_t) { return 50.0F; });
-    spec.levelFiles.push_back(later);
-    addSession(spec, "Hours");
+    layout.levelFiles.push_back(later);
+    addSession(layout, "Hours");
     ASSERT_EQ(run({"-i", "1"}).status, 0);
     const auto data = rows(result("Hours.csv"));
     ASSERT_EQ(data.size(), 2U);
@@ -158,14 +158,14 @@ TEST_F(SessionRun, MissingHourFileIsABreakInTheSequence) {
 }
 
 TEST_F(SessionRun, CWeightingUsesTheCColumns) {
-    SessionSpec spec = namedSession("Cw");
-    spec.levelFiles[0].rows = makeRows(600, 1, [](std::size_t, LevelRow& r) {
+    SessionLayout layout = namedSession("Cw");
+    layout.levelFiles[0].rows = makeRows(600, 1, [](std::size_t, LevelRow& r) {
         r.splA = 40.0F;
         r.leqA = 41.0F;
         r.splC = 60.0F;
         r.leqC = 61.0F;
     });
-    addSession(spec, "Cw");
+    addSession(layout, "Cw");
     ASSERT_EQ(run({"-i", "1", "-w", "C", "-leq", "30"}).status, 0);
     const auto data = rows(result("Cw.csv"));
     ASSERT_EQ(data.size(), 1U);
@@ -178,12 +178,12 @@ TEST_F(SessionRun, CWeightingUsesTheCColumns) {
 }
 
 TEST_F(SessionRun, BatteryIsTheIntervalsLowestReadingAndOverloadCoversTheInterval) {
-    SessionSpec spec = namedSession("Batt");
-    spec.levelFiles[0].rows = makeRows(1200, 1, [](std::size_t slot, LevelRow& r) {
+    SessionLayout layout = namedSession("Batt");
+    layout.levelFiles[0].rows = makeRows(1200, 1, [](std::size_t slot, LevelRow& r) {
         r.battery = slot == 300 ? 11.9F : (slot == 400 ? 0.0F : 12.4F);
         if (slot == 350) r.condition = 3;
     });
-    addSession(spec, "Batt");
+    addSession(layout, "Batt");
     ASSERT_EQ(run({"-i", "1"}).status, 0);
     const auto data = rows(result("Batt.csv"));
     ASSERT_EQ(data.size(), 2U);
@@ -194,12 +194,12 @@ TEST_F(SessionRun, BatteryIsTheIntervalsLowestReadingAndOverloadCoversTheInterva
 }
 
 TEST_F(SessionRun, ShortLeqRowsReachTheirSessionsFile) {
-    SessionSpec spec = namedSession("Leq");
+    SessionLayout layout = namedSession("Leq");
     // 0:0.1 .. 2:25.0: two whole minutes and 25 s; 10 s intervals with a level per interval.
-    spec.levelFiles[0].rows =
+    layout.levelFiles[0].rows =
         levelRows(1, 1450, [](std::size_t slot) { return 40.0F + static_cast<float>((slot - 1) / 100); });
-    spec.levelFiles[0].rows[150].condition = 3;  // overload in the second 10 s interval
-    addSession(spec, "Leq");
+    layout.levelFiles[0].rows[150].condition = 3;  // overload in the second 10 s interval
+    addSession(layout, "Leq");
     ASSERT_EQ(run({"-i", "1", "-leq", "10"}).status, 0);
     const auto leq = rows(result("Leq_LEQ.csv"));
     // 12 intervals closed by the two statistics boundaries, then the two complete ones
@@ -218,12 +218,12 @@ TEST_F(SessionRun, ShortLeqRowsReachTheirSessionsFile) {
 }
 
 TEST_F(SessionRun, TwoSessionsInOneRunGiveTheFilesOfTwoSeparateRuns) {
-    SessionSpec a = namedSession("Alpha");
+    SessionLayout a = namedSession("Alpha");
     auto rowsA = levelRows(1, 1250, [](std::size_t slot) { return 50.0F + static_cast<float>(slot % 7); });
     rowsA.erase(rowsA.begin() + 1240);  // a gap near the end of the first session
     rowsA[1245].battery = 11.0F;
     a.levelFiles[0].rows = rowsA;
-    SessionSpec b = namedSession("Beta");
+    SessionLayout b = namedSession("Beta");
     b.levelFiles[0].rows = levelRows(3001, 4800, [](std::size_t slot) { return 45.0F + static_cast<float>(slot % 3); });
     addSession(a, "Alpha");
     addSession(b, "Beta");
@@ -240,13 +240,13 @@ TEST_F(SessionRun, TwoSessionsInOneRunGiveTheFilesOfTwoSeparateRuns) {
 }
 
 TEST_F(SessionRun, HeaderBlockCarriesSessionAndFileValues) {
-    SessionSpec spec = namedSession("Hdr");
-    spec.info.sessionStart = "01/03/2020 09:05:07";
-    spec.info.sessionEnd = "01/03/2020 11:00:00";
-    spec.info.timeWeighting = "1";  // Slow
-    spec.levelFiles[0].header.serialNumber = "SN123456789";
-    spec.levelFiles[0].header.sessionTitle = std::string(90, 'T');
-    addSession(spec, "Hdr");
+    SessionLayout layout = namedSession("Hdr");
+    layout.info.sessionStart = "01/03/2020 09:05:07";
+    layout.info.sessionEnd = "01/03/2020 11:00:00";
+    layout.info.timeWeighting = "1";  // Slow
+    layout.levelFiles[0].header.serialNumber = "SN123456789";
+    layout.levelFiles[0].header.sessionTitle = std::string(90, 'T');
+    addSession(layout, "Hdr");
     ASSERT_EQ(run({"-i", "60", "-bin"}).status, 0);
     // Sub-directory layout: the time weighting and the 60-minute interval spell the name.
     const std::string general = result("Hdr/GEN_A_60_S.csv");
@@ -263,15 +263,15 @@ TEST_F(SessionRun, HeaderBlockCarriesSessionAndFileValues) {
 }
 
 TEST_F(SessionRun, ProgressLinesInBothLayouts) {
-    SessionSpec spec = namedSession("Prog");
-    spec.levelFiles.clear();
+    SessionLayout layout = namedSession("Prog");
+    layout.levelFiles.clear();
     for (unsigned h = 8; h <= 10; ++h) {
-        LevelFileSpec f;
+        LevelFileLayout f;
         f.header.hour = h;
         f.rows = makeRows(5);
-        spec.levelFiles.push_back(f);
+        layout.levelFiles.push_back(f);
     }
-    addSession(spec, "Prog");
+    addSession(layout, "Prog");
     RunResult r = run({});
     EXPECT_NE(r.output.find("33.3 % Complete\r\n66.7 % Complete\r\n100.0 % Complete\r\n\r\n"),
               std::string::npos)
@@ -296,9 +296,9 @@ TEST_F(SessionRun, SessionWhoseGeneralFileCannotBeCreatedIsSkipped) {
 }
 
 TEST_F(SessionRun, SessionWithoutReadableRecordsLeavesAnEmptyGeneralFile) {
-    SessionSpec spec = namedSession("Empty");
-    spec.levelFiles[0].rows.clear();
-    addSession(spec, "Empty");
+    SessionLayout layout = namedSession("Empty");
+    layout.levelFiles[0].rows.clear();
+    addSession(layout, "Empty");
     ASSERT_EQ(run({}).status, 0);
     EXPECT_EQ(rows(result("Empty.csv")).size(), 0U);
     EXPECT_EQ(headerLines(result("Empty.csv")).size(), 21U);

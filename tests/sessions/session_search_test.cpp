@@ -11,7 +11,7 @@
 namespace {
 
 using testing_support::namedSession;
-using testing_support::SessionSpec;
+using testing_support::SessionLayout;
 using Strings = std::vector<std::string>;
 
 std::string real(const std::string& path) {
@@ -33,8 +33,8 @@ class SearchTest : public ::testing::Test {
     orv::SessionTable table;
     std::string out;
 
-    std::string session(const std::string& rel, const SessionSpec& spec) {
-        return testing_support::writeSession(root + "/" + rel, spec);
+    std::string session(const std::string& rel, const SessionLayout& layout) {
+        return testing_support::writeSession(root + "/" + rel, layout);
     }
     std::string session(const std::string& rel) {
         return session(rel, namedSession(rel.substr(rel.find_last_of('/') + 1)));
@@ -62,15 +62,15 @@ class SearchTest : public ::testing::Test {
 };
 
 TEST_F(SearchTest, SubdirectorySessionsInListingOrderWithSortedFileLists) {
-    SessionSpec spec = namedSession("b");
-    spec.levelFiles[0].name = "c.csv";
-    spec.levelFiles.push_back({"data.000", "A.CSV", {}, {}});
-    spec.levelFiles.push_back({"data.001", "b.csv", {}, {}});
-    spec.levelFiles.push_back({"data", "z.csv", {}, {}});
-    spec.levelFiles.push_back({"other", "x.csv", {}, {}});  // not a data directory
-    spec.extraDirs = {"data.000/dir.csv"};                  // not a file
-    spec.waveFiles = {"data.001/2.wav", "data.000/1.WAV"};
-    session("b", spec);
+    SessionLayout layout = namedSession("b");
+    layout.levelFiles[0].name = "c.csv";
+    layout.levelFiles.push_back({"data.000", "A.CSV", {}, {}});
+    layout.levelFiles.push_back({"data.001", "b.csv", {}, {}});
+    layout.levelFiles.push_back({"data", "z.csv", {}, {}});
+    layout.levelFiles.push_back({"other", "x.csv", {}, {}});  // not a data directory
+    layout.extraDirs = {"data.000/dir.csv"};                  // not a file
+    layout.waveFiles = {"data.001/2.wav", "data.000/1.WAV"};
+    session("b", layout);
     session("a");
     session("C");
     EXPECT_EQ(search({root}), added("C") + added("a") + added("b"));
@@ -83,7 +83,7 @@ TEST_F(SearchTest, SubdirectorySessionsInListingOrderWithSortedFileLists) {
 }
 
 TEST_F(SearchTest, CandidatesThatAreNotSessions) {
-    SessionSpec data001 = namedSession("n1"), noInfo = data001, noCsv = data001, upper = data001;
+    SessionLayout data001 = namedSession("n1"), noInfo = data001, noCsv = data001, upper = data001;
     data001.levelFiles[0].dataDir = "data.001";
     noInfo.writeInfo = false;
     noCsv.levelFiles[0].name = "hour.txt";
@@ -102,10 +102,10 @@ TEST_F(SearchTest, CandidatesThatAreNotSessions) {
 
 // As with data.000, a session's files may be in any of its data directories.
 TEST_F(SearchTest, DataFilesInAnyDataDirectoryCount) {
-    SessionSpec spec = namedSession("S");
-    spec.waveFiles = {"data/a.wav", "data.000/b.wav", "data.001/c.wav"};
-    spec.extraDirs = {"data.002"};  // visited last, holding nothing
-    session("S", spec);
+    SessionLayout layout = namedSession("S");
+    layout.waveFiles = {"data/a.wav", "data.000/b.wav", "data.001/c.wav"};
+    layout.extraDirs = {"data.002"};  // visited last, holding nothing
+    session("S", layout);
     search({root}, false, true);
     ASSERT_EQ(found.count(), 1U);
     EXPECT_EQ(found.entries[0].waveFiles,
@@ -143,7 +143,7 @@ TEST_F(SearchTest, LastCandidateDecidesWhetherTheSearchPathIsTested) {
     session("P");
     session("P/A");
     EXPECT_EQ(search({root + "/P"}), added("A"));
-    SessionSpec refused = namedSession("Z");
+    SessionLayout refused = namedSession("Z");
     refused.writeInfo = false;
     session("P/Z", refused);
     EXPECT_EQ(search({root + "/P"}), added("A") + added(root + "/P"));
@@ -155,7 +155,7 @@ TEST_F(SearchTest, DuplicatesCompareWholeDirectories) {
     const std::string x = root + "/x";
     EXPECT_EQ(search({x + "/S10", x + "/S1"}), added(x + "/S10") + added(x + "/S1"));
     EXPECT_EQ(search({x, x + "/./S1/"}), added("S1") + added("S10") + duplicate(x + "/./S1/"));
-    const SessionSpec renamed = namedSession("not the directory name");
+    const SessionLayout renamed = namedSession("not the directory name");
     session("y/S2", renamed);
     EXPECT_EQ(search({root + "/y/S2", root + "/y"}), added(root + "/y/S2") + duplicate("S2"));
     // A subdirectory named like an accepted session is a duplicate whatever it holds.

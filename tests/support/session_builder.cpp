@@ -96,28 +96,28 @@ void writeLevelFile(const std::string& path, const LevelFileHeader& header,
     writeFile(path, levelFileText(header, rows));
 }
 
-SessionSpec namedSession(const std::string& name) {
-    SessionSpec spec;
-    spec.info.sessionName = name;
-    for (LevelFileSpec& file : spec.levelFiles)
+SessionLayout namedSession(const std::string& name) {
+    SessionLayout layout;
+    layout.info.sessionName = name;
+    for (LevelFileLayout& file : layout.levelFiles)
         file.header.sessionTitle = name;
-    return spec;
+    return layout;
 }
 
-std::string writeSession(const std::string& dir, const SessionSpec& spec) {
+std::string writeSession(const std::string& dir, const SessionLayout& layout) {
     makeDirs(dir);
-    if (spec.writeInfo) {
-        std::string infName = spec.infName;
+    if (layout.writeInfo) {
+        std::string infName = layout.infName;
         if (infName.empty()) infName = dir.substr(dir.find_last_of('/') + 1) + ".inf";
-        writeInfoFile(dir + "/" + infName, spec.info);
+        writeInfoFile(dir + "/" + infName, layout.info);
     }
-    for (const LevelFileSpec& file : spec.levelFiles) {
+    for (const LevelFileLayout& file : layout.levelFiles) {
         const std::string name = file.name.empty() ? levelFileName(file.header) : file.name;
         writeLevelFile(dir + "/" + file.dataDir + "/" + name, file.header, file.rows);
     }
-    for (const std::string& wave : spec.waveFiles)
+    for (const std::string& wave : layout.waveFiles)
         writeFile(dir + "/" + wave, "");
-    for (const std::string& extra : spec.extraDirs)
+    for (const std::string& extra : layout.extraDirs)
         makeDirs(dir + "/" + extra);
     return dir;
 }

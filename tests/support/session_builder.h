@@ -63,7 +63,7 @@ std::string levelFileName(const LevelFileHeader& header);
 void writeLevelFile(const std::string& path, const LevelFileHeader& header,
                     const std::vector<LevelRow>& rows);
 
-struct LevelFileSpec {
+struct LevelFileLayout {
     std::string dataDir = "data.000";
     std::string name;  // empty: levelFileName(header)
     LevelFileHeader header;
@@ -72,19 +72,19 @@ struct LevelFileSpec {
 
 // A session directory. Written by writeSession as dir/<infName>, dir/<dataDir>/<level file>
 // and an empty file for every wave file path.
-struct SessionSpec {
+struct SessionLayout {
     bool writeInfo = true;
     std::string infName;  // empty: "<last part of dir>.inf"
     InfoFields info;
-    std::vector<LevelFileSpec> levelFiles = {LevelFileSpec{}};
+    std::vector<LevelFileLayout> levelFiles = {LevelFileLayout{}};
     std::vector<std::string> waveFiles;  // paths relative to the session, e.g. data.000/x.wav
     std::vector<std::string> extraDirs;  // empty directories, relative to the session
 };
 
 // A session named `name`: its information file names it, its level files carry it as title.
-SessionSpec namedSession(const std::string& name);
+SessionLayout namedSession(const std::string& name);
 
 // Writes the session into `dir` (created as needed) and returns `dir`.
-std::string writeSession(const std::string& dir, const SessionSpec& spec);
+std::string writeSession(const std::string& dir, const SessionLayout& layout);
 
 }  // namespace testing_support
