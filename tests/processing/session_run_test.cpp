@@ -1,7 +1,10 @@
 // End-to-end: the whole tool on generated sessions, checking the result files.
 #include <gtest/gtest.h>
 
+#include <unistd.h>
+
 #include <cmath>
+#include <filesystem>
 #include <iomanip>
 #include <sstream>
 
@@ -302,6 +305,22 @@ TEST_F(SessionRun, SessionWithoutReadableRecordsLeavesAnEmptyGeneralFile) {
     ASSERT_EQ(run({}).status, 0);
     EXPECT_EQ(rows(result("Empty.csv")).size(), 0U);
     EXPECT_EQ(headerLines(result("Empty.csv")).size(), 21U);
+}
+
+TEST_F(SessionRun, RelativePathsKeepWorkingForEverySession) {
+    addSession(namedSession("One"), "One");
+    writeSession(dir_ / "other/Two", namedSession("Two"));
+    CurrentDirGuard restore;
+    ASSERT_EQ(::chdir(dir_.path().c_str()), 0);
+    const RunResult r = runTool({"-s", "sessions", "other/Two", "-d", "out"});
+    EXPECT_EQ(r.status, 0);
+    EXPECT_NE(r.output.find("Processed 2 out of 2 sessions"), std::string::npos);
+    EXPECT_TRUE(exists(result("One.csv")));
+    EXPECT_TRUE(exists(result("Two.csv")));
+    EXPECT_EQ(rows(result("Two.csv")).size(), 1U);
+    char cwd[4096];
+    ASSERT_NE(::getcwd(cwd, sizeof cwd), nullptr);
+    EXPECT_EQ(std::string(cwd), std::filesystem::canonical(dir_.path()).string());
 }
 
 }  // namespace
