@@ -75,8 +75,6 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
                 ? 0U
                 : static_cast<std::uint64_t>(std::ceil(lanes[l].primeSeconds * rate));
         primeEnd_[l] = settleEnd_[l] + prime;
-        primeDecay_[l] = std::pow(1.0 - alpha_, static_cast<double>(prime));
-        if (active_[l]) warmEnd_ = std::max(warmEnd_, primeEnd_[l]);
     }
     histogram_.reserve(W);
     for (std::size_t l = 0; l < W; ++l) {
@@ -91,6 +89,11 @@ void BandLevels<W>::reset() {
     seen_ = 0;
     tw_.fill(0.0);
     primeSum_.fill(0.0);
+    primeCount_.fill(0);
+    for (std::size_t l = 0; l < W; ++l)
+        primed_[l] = !active_[l] || code_ == TWeight::N;
+    allPrimed_ = code_ != TWeight::N &&
+                 std::all_of(primed_.begin(), primed_.end(), [](bool p) { return p; });
     periodSum_.fill(0.0);
     periodValid_.fill(false);
     periodPhase_ = 0;
@@ -122,23 +125,42 @@ void BandLevels<W>::resetStatistics() {
 template <std::size_t W>
 void BandLevels<W>::tick() {
     for (std::size_t l = 0; l < W; ++l) {
-        if (active_[l] && seen_ >= primeEnd_[l]) histogram_[l].add(Dsp::powerToDb(tw_[l]));
+        if (active_[l] && primed_[l]) histogram_[l].add(Dsp::powerToDb(tw_[l]));
     }
 }
 
 template <std::size_t W>
 void BandLevels<W>::process(const float* frames, std::size_t count, bool entering) {
-    if (entering && code_ != TWeight::N && seen_ >= warmEnd_) {
-        processFast(frames, count);
-    } else {
-        // Up to the end of the warm-up sample by sample, then the fast path.
+    while (count > 0) {
+        if (entering && allPrimed_) {
+            processFast(frames, count);
+            return;
+        }
+        // Sample by sample up to the last lane's end of priming (never during pre-roll,
+        // which extends the priming), then the fast path.
         std::size_t slow = count;
-        if (entering && code_ != TWeight::N && warmEnd_ - seen_ < count) {
-            slow = static_cast<std::size_t>(warmEnd_ - seen_);
+        if (entering && code_ != TWeight::N) {
+            std::uint64_t until = 0;
+            for (std::size_t l = 0; l < W; ++l) {
+                if (!primed_[l]) until = std::max(until, std::max(primeEnd_[l], seen_) - seen_ + 1);
+            }
+            slow = static_cast<std::size_t>(std::min<std::uint64_t>(count, until));
         }
         processSlow(frames, slow, entering);
-        if (slow < count) processFast(frames + slow * W, count - slow);
+        frames += slow * W;
+        count -= slow;
+        allPrimed_ = code_ != TWeight::N &&
+                     std::all_of(primed_.begin(), primed_.end(), [](bool p) { return p; });
     }
+}
+
+template <std::size_t W>
+void BandLevels<W>::finishPriming(std::size_t l) {
+    if (primeCount_[l] > 0) {
+        const double k = static_cast<double>(primeCount_[l]);
+        tw_[l] += std::pow(1.0 - alpha_, k) * primeSum_[l] / k;
+    }
+    primed_[l] = true;
 }
 
 template <std::size_t W>
@@ -185,7 +207,6 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
             const float v = frames[k * W + l];
             const double p = static_cast<double>(v) * static_cast<double>(v);
             if (entering) energy_[l] += p;
-            const bool settledNow = seen_ >= primeEnd_[l];
             if (code_ == TWeight::N) {
                 if (!entering) continue;
                 // A period counts only when it starts settled.
@@ -195,15 +216,17 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
                 continue;
             }
             if (seen_ < settleEnd_[l]) continue;
-            tw_[l] += alpha_ * (p - tw_[l]);
-            if (!settledNow) {
-                primeSum_[l] += p;
-                if (seen_ + 1 == primeEnd_[l]) {
-                    const double samples = static_cast<double>(primeEnd_[l] - settleEnd_[l]);
-                    tw_[l] += primeDecay_[l] * primeSum_[l] / samples;
+            if (!primed_[l]) {
+                if (entering && seen_ >= primeEnd_[l]) {
+                    finishPriming(l);
+                } else {
+                    tw_[l] += alpha_ * (p - tw_[l]);
+                    primeSum_[l] += p;
+                    ++primeCount_[l];
+                    continue;
                 }
-                continue;
             }
+            tw_[l] += alpha_ * (p - tw_[l]);
             if (entering) {
                 peak_[l] = std::max(peak_[l], std::fabs(v));
                 max_[l] = std::max(max_[l], tw_[l]);
@@ -254,7 +277,7 @@ void BandLevels<W>::endCall() {
 
 template <std::size_t W>
 bool BandLevels<W>::settled(std::size_t lane) const {
-    return seen_ >= primeEnd_[lane];
+    return primed_[lane];
 }
 
 template <std::size_t W>

@@ -13,12 +13,13 @@
 //
 // Warm-up. A lane counts every sample it is given, pre-roll included, from reset. For its
 // first settleSamples the filters ahead of it are still settling: the time weighting is
-// idle. For the next primeSamples it runs from zero while the mean square m of those
-// samples is collected; then m * (1 - alpha)^primeSamples is added to its state, which is
-// exactly the result of starting the average at m instead of zero. From then on the lane
-// is settled. Only settled samples enter Lmax, Lmin, Ln and Lpeak; every entered sample
-// enters Leq and the short Leqs. N has no priming: a 100 ms period counts only when it
-// starts settled.
+// idle. Then the time weighting runs from zero while the mean square m of its input is
+// collected, for primeSamples or, when pre-roll lasts longer, up to the end of the pre-roll;
+// over k such samples, m * (1 - alpha)^k is then added to its state, which is exactly the
+// result of having started the average at m instead of zero: m stands in for the unknown
+// audio before. From then on the lane is settled. Only settled samples enter Lmax, Lmin, Ln and
+// Lpeak; every entered sample enters Leq and the short Leqs. N has no priming: a 100 ms period
+// counts only when it starts settled.
 #pragma once
 
 #include <array>
@@ -71,6 +72,7 @@ class BandLevels {
   private:
     void processFast(const float* frames, std::size_t count);
     void processSlow(const float* frames, std::size_t count, bool entering);
+    void finishPriming(std::size_t lane);
     void tick();
 
     unsigned code_ = 0;
@@ -80,14 +82,15 @@ class BandLevels {
     std::size_t periodSamples_ = 1;  // 100 ms (N)
     std::array<bool, W> active_{};
     std::array<std::uint64_t, W> settleEnd_{};  // first sample after filter settling
-    std::array<std::uint64_t, W> primeEnd_{};   // first settled sample
-    std::array<double, W> primeDecay_{};
-    std::uint64_t warmEnd_ = 0;  // all active lanes settled from here
+    std::array<std::uint64_t, W> primeEnd_{};   // earliest first settled sample
 
     // Running state.
     std::uint64_t seen_ = 0;
     std::array<double, W> tw_{};
     std::array<double, W> primeSum_{};
+    std::array<std::uint64_t, W> primeCount_{};
+    std::array<bool, W> primed_{};
+    bool allPrimed_ = false;
     std::size_t tickPhase_ = 0;
     std::size_t periodPhase_ = 0;
     std::array<double, W> periodSum_{};

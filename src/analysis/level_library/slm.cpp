@@ -158,6 +158,8 @@ Slm::Slm(double sampleRate, unsigned channels, std::size_t maxBlock)
 }
 
 Slm::~Slm() = default;
+Slm::Slm(Slm&&) noexcept = default;
+Slm& Slm::operator=(Slm&&) noexcept = default;
 
 void Slm::initFullOct(unsigned tw, unsigned fw, unsigned first, unsigned last, double sampleRate,
                       unsigned reserved) {

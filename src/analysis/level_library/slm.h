@@ -59,6 +59,7 @@
 
 #include "band_levels.h"
 #include "fweight.h"
+#include "ipp_buffer.h"
 #include "leq.h"
 #include "octave_filter.h"
 #include "sos.h"
@@ -83,6 +84,8 @@ class Slm {
     ~Slm();
     Slm(const Slm&) = delete;
     Slm& operator=(const Slm&) = delete;
+    Slm(Slm&&) noexcept;
+    Slm& operator=(Slm&&) noexcept;
 
     // Sets up the bank: time weighting tw (N, F, S), frequency weighting fw (Z, A, C) ahead
     // of it, bands first..last (inclusive). `reserved` must be 0. Throws
