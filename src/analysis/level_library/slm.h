@@ -56,17 +56,16 @@
 // is primed over all of it. A band whose warm-up fits in the pre-roll starts its statistics
 // at the block's first sample. How much pre-roll makes a block read as the same stretch of
 // one continuous analysis (within 0.2 dB for Leq, Lmax, Lmin and Ln in every band,
-// stationary noise, tested): F or N: 2 s (the 6.3 Hz third-octave band finishes its warm-up
-// 0.6 s into the block); S: 8 s, because the S average still carries 13 % of the audio
-// older than 2 s; with 2 s of pre-roll the S levels of bands below about 30 Hz may differ by
-// up to 0.7 dB during the first seconds of the block.
+// stationary noise, tested): F: 2 s (the 6.3 Hz third-octave band finishes its warm-up
+// 0.6 s into the block; N, which has no averaging memory, needs no more); S: 8 s, because the S
+// average still carries 13 % of the audio older than 2 s; with 2 s of pre-roll the S levels of
+// bands below about 30 Hz may differ by up to 0.7 dB during the first seconds of the block.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
 #include <initializer_list>
 #include <memory>
-#include <optional>
 #include <vector>
 
 #include "band_levels.h"
