@@ -58,6 +58,8 @@ TEST(DemoCommandLine, RefusedInput) {
         {"--triggered", "--wave-minutes", "2"},
         {"--duration", "86400"},                        // one wave file of 24 h is too long
         {"--duration", "86400", "--split-wave", "60"},  // 1440 parts
+        // The wave file would be named 000030, which a reader takes for 30:00:00.
+        {"--start", "2024-03-05 00:00:25", "--pre-record", "5"},
     };
     for (const Args& args : refused) {
         std::string line;
@@ -67,6 +69,7 @@ TEST(DemoCommandLine, RefusedInput) {
     }
     EXPECT_EQ(parseCommandLine({"--duration", "86400", "--split-wave", "3600"}).error, "");
     EXPECT_EQ(parseCommandLine({"--duration", "86400", "--wave-minutes", "10"}).error, "");
+    EXPECT_EQ(parseCommandLine({"--start", "2024-03-05 00:00:25", "--no-audio"}).error, "");
 }
 
 }  // namespace

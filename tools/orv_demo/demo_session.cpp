@@ -28,6 +28,14 @@ constexpr std::int64_t kMaxParts = 1000;         // first part and parts _001 to
 constexpr std::int64_t kWarmUpRecords = 10;      // audio run before a recording to settle the meter
 constexpr std::int64_t kBlockRecords = 10;
 
+// A reader takes a time field of 59 or less in a wave file name as an hour, so a recording
+// named 00:00:01 to 00:00:59 would be placed at 01:00:00 to 59:00:00; such names are not
+// written.
+bool nameReadAsHour(std::int64_t nameTime) {
+    const std::int64_t ofDay = nameTime % 86400;
+    return ofDay >= 1 && ofDay <= 59;
+}
+
 unsigned preRecordOf(const DemoOptions& o) {
     if (o.preRecordSeconds >= 0) return static_cast<unsigned>(o.preRecordSeconds);
     return o.triggered ? 5U : 0U;
@@ -102,6 +110,7 @@ SessionPlan planSession(const DemoOptions& o, const SoundScene& scene) {
             const std::int64_t first = start * 10;
             if (start < 0 || first + seconds * 10 > plan.recordCount) continue;
             if (!plan.recordings.empty() && first < plan.recordings.back().endRecord) continue;
+            if (nameReadAsHour(plan.startSeconds + trigger)) continue;
             addRecording(plan, o, first, seconds, plan.startSeconds + trigger);
         }
     }
@@ -284,6 +293,9 @@ std::string checkOptions(const DemoOptions& o) {
                    "--no-audio";
         if ((seconds + part - 1) / part > kMaxParts)
             return "a recording may be split into at most 1000 wave files";
+        if (toSeconds(o.start) && nameReadAsHour(*toSeconds(o.start) + preRecordOf(o)))
+            return "a wave file named 00:00:01 to 00:00:59 would be read as an hour: choose "
+                   "another start or pre-record length";
     }
     return {};
 }
