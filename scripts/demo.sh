@@ -1,9 +1,13 @@
 #!/usr/bin/env bash
-# Builds the tool and runs it on a search path in a temporary directory.
+# Builds the tools, writes the demo session (a few minutes of a synthetic roadside,
+# crossing an hour) and runs orv_cmd on it with 1-minute statistics and 1-second Leqs.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 ./scripts/build.sh
-work=$(mktemp -d)
-mkdir -p "$work/sessions"
-./build/orv_cmd -s "$work/sessions" -d "$work/results"
-echo "Results (none yet for an empty search path): $work/results"
+rm -rf demo
+mkdir -p demo
+(cd demo && ../build/orv_demo)
+./build/orv_cmd -s demo/demo-session -d demo/results -leq 1 -i 1
+echo
+echo "Results in demo/results:"
+ls -l demo/results
