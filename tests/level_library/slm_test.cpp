@@ -259,10 +259,12 @@ void checkSettlingWithoutPreRoll(bool third, unsigned tw) {
     }
 }
 
-TEST(MeterStartUp, ASteadyToneReadsSteadyFromTheFirstBlockInEveryThirdOctaveBandS) {
+TEST(MeterStartUp, ASteadyToneReadsSteadyFromTheFirstBlockInEveryThirdOctaveBand) {
     checkSettlingWithoutPreRoll(true, TWeight::S);
+    checkSettlingWithoutPreRoll(true, TWeight::F);
 }
-TEST(MeterStartUp, ASteadyToneReadsSteadyFromTheFirstBlockInEveryOctaveBandF) {
+TEST(MeterStartUp, ASteadyToneReadsSteadyFromTheFirstBlockInEveryOctaveBand) {
+    checkSettlingWithoutPreRoll(false, TWeight::S);
     checkSettlingWithoutPreRoll(false, TWeight::F);
 }
 
