@@ -55,6 +55,32 @@ TEST(MeterStatistics, LevelStepGivesExtremesPercentilesAndEnergyMean) {
     }
 }
 
+TEST(MeterStatistics, CWeightedPeakOfSingleCyclesIsInsideClass1) {
+    // IEC 61672-1 LCpeak - LC of the steady tone: one cycle of 8 kHz 3.4 dB (+-2.0), one
+    // cycle of 500 Hz 3.5 dB (+-1.0), a positive or negative half cycle of 500 Hz 2.4 dB
+    // (+-1.0).
+    struct Case {
+        double f, cycles, sign, expected, tolerance;
+    };
+    for (const Case c : {Case{8000.0, 1.0, 1.0, 3.4, 2.0}, Case{500.0, 1.0, 1.0, 3.5, 1.0},
+                         Case{500.0, 0.5, 1.0, 2.4, 1.0}, Case{500.0, 0.5, -1.0, 2.4, 1.0}}) {
+        Slm slm(kFs, 1, 48000);
+        slm.initAuxCh(kAllPass, kNoCorners, TWeight::F, FWeight::C, kFs);
+        slm.resetAll();
+        std::vector<float> x(2 * 48000, 0.0F);  // 1 s of silence, the burst, silence
+        const auto burst = static_cast<std::size_t>(std::lround(c.cycles * kFs / c.f));
+        for (std::size_t i = 0; i < burst; ++i) {
+            x[48000 + i] = static_cast<float>(
+                c.sign * std::sin(2.0 * std::numbers::pi * c.f * static_cast<double>(i) / kFs));
+        }
+        feed(slm, x.data(), x.size());
+        const double steady =
+            db(1.0 / std::sqrt(2.0)) + FWeight::designResponseDb(FWeight::C, c.f, kFs);
+        EXPECT_NEAR(readAux(slm).lpeak - steady, c.expected, c.tolerance)
+            << c.f << " Hz x " << c.cycles;
+    }
+}
+
 TEST(MeterStatistics, PercentilesFollowTheTimeSpentAboveEachLevel) {
     // N levels: 100 ms periods at 50, 51, ..., 69 dB, each level once per 2 s: Ln is the
     // level exceeded for n % of the time, to the 0.1 dB class.

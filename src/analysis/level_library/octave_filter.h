@@ -21,7 +21,6 @@
 
 #include <array>
 #include <cstddef>
-#include <memory>
 #include <vector>
 
 #include "sos.h"
