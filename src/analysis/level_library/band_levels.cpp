@@ -4,6 +4,7 @@
 #include <cmath>
 #include <cstring>
 #include <limits>
+#include <numbers>
 
 #include "dsp.h"
 #include "tweight.h"
@@ -20,7 +21,7 @@ typedef double D4 __attribute__((vector_size(4 * sizeof(double))));
 // one fused multiply-add per frame in the x86-64-v3 clone.
 __attribute__((target_clones("arch=x86-64-v3", "default"), optimize("fp-contract=fast"))) void
 settledRun8(const float* frames, std::size_t run, double a, double* energy, double* tw,
-            double* maxima, double* minima, float* peak) {
+            double* maxima, double* minima, float* peak, float* magnitude) {
     D4 e[2], y[2], mx[2], mn[2];
     for (std::size_t h = 0; h < 2; ++h) {
         std::memcpy(&e[h], energy + 4 * h, sizeof(D4));
@@ -30,6 +31,8 @@ settledRun8(const float* frames, std::size_t run, double a, double* energy, doub
     }
     F8 pk;
     std::memcpy(&pk, peak, sizeof(F8));
+    F8 mag;
+    std::memcpy(&mag, magnitude, sizeof(F8));
     const D4 gain = D4{} + a;
     const D4 keep = D4{} + (1.0 - a);
     for (std::size_t k = 0; k < run; ++k) {
@@ -37,6 +40,7 @@ settledRun8(const float* frames, std::size_t run, double a, double* energy, doub
         std::memcpy(&v, frames + 8 * k, sizeof(F8));
         const F8 av = v < 0.0F ? -v : v;
         pk = pk > av ? pk : av;
+        mag = mag > av ? mag : av;
         const F4 half[2] = {__builtin_shufflevector(v, v, 0, 1, 2, 3),
                             __builtin_shufflevector(v, v, 4, 5, 6, 7)};
         for (std::size_t h = 0; h < 2; ++h) {
@@ -55,6 +59,38 @@ settledRun8(const float* frames, std::size_t run, double a, double* energy, doub
         std::memcpy(minima + 4 * h, &mn[h], sizeof(D4));
     }
     std::memcpy(peak, &pk, sizeof(F8));
+    std::memcpy(magnitude, &mag, sizeof(F8));
+}
+
+// Lanczos (a = 4) interpolation at quarter-sample offsets t = 0.25, 0.5, 0.75 from the
+// sample at tap 3 of eight consecutive samples; each kernel sums to one.
+struct QuarterKernels {
+    float h[3][8];
+};
+
+QuarterKernels makeQuarterKernels() {
+    QuarterKernels k{};
+    auto sinc = [](double x) {
+        return x == 0.0 ? 1.0 : std::sin(std::numbers::pi * x) / (std::numbers::pi * x);
+    };
+    for (int t = 0; t < 3; ++t) {
+        const double offset = 0.25 * (t + 1);
+        double sum = 0.0;
+        double taps[8];
+        for (int i = 0; i < 8; ++i) {
+            const double x = i - 3 - offset;
+            taps[i] = sinc(x) * sinc(x / 4.0);
+            sum += taps[i];
+        }
+        for (int i = 0; i < 8; ++i)
+            k.h[t][i] = static_cast<float>(taps[i] / sum);
+    }
+    return k;
+}
+
+const QuarterKernels& quarterKernels() {
+    static const QuarterKernels kKernels = makeQuarterKernels();
+    return kKernels;
 }
 
 }  // namespace
@@ -69,6 +105,8 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
     if (code_ != TWeight::N) alpha_ = -std::expm1(-1.0 / (TWeight::timeConstant(code_) * rate));
     for (std::size_t l = 0; l < W; ++l) {
         active_[l] = lanes[l].active;
+        interpolate_[l] = lanes[l].active && lanes[l].interpolatePeak;
+        anyInterpolated_ = anyInterpolated_ || interpolate_[l];
         settleEnd_[l] = static_cast<std::uint64_t>(std::ceil(lanes[l].settleSeconds * rate));
         const auto prime =
             code_ == TWeight::N
@@ -90,6 +128,8 @@ void BandLevels<W>::reset() {
     tw_.fill(0.0);
     primeSum_.fill(0.0);
     primeCount_.fill(0);
+    tail_.fill(0.0F);
+    tailSettled_ = false;
     for (std::size_t l = 0; l < W; ++l)
         primed_[l] = !active_[l] || code_ == TWeight::N;
     allPrimed_ = code_ != TWeight::N &&
@@ -108,6 +148,8 @@ void BandLevels<W>::resetStatistics() {
     energy_.fill(0.0);
     callEnergy_.fill(0.0);
     peak_.fill(0.0F);
+    truePeak_.fill(0.0F);
+    tailSettled_ = false;  // frames still waiting for interpolation belong to the old interval
     max_.fill(-std::numeric_limits<double>::infinity());
     min_.fill(std::numeric_limits<double>::infinity());
     hasExtremes_.fill(false);
@@ -166,13 +208,14 @@ void BandLevels<W>::finishPriming(std::size_t l) {
 template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     const double a = alpha_;
+    std::array<float, W> magnitude{};  // largest magnitude per lane in this call
     std::size_t i = 0;
     while (i < count) {
         const std::size_t run = std::min(count - i, tickSamples_ - tickPhase_);
         const float* f = frames + i * W;
         if constexpr (W == 8) {
             settledRun8(f, run, a, energy_.data(), tw_.data(), max_.data(), min_.data(),
-                        peak_.data());
+                        peak_.data(), magnitude.data());
         } else {
             for (std::size_t k = 0; k < run; ++k) {
                 for (std::size_t l = 0; l < W; ++l) {
@@ -180,6 +223,7 @@ void BandLevels<W>::processFast(const float* frames, std::size_t count) {
                     const double p = static_cast<double>(v) * static_cast<double>(v);
                     energy_[l] += p;
                     peak_[l] = std::max(peak_[l], std::fabs(v));
+                    magnitude[l] = std::max(magnitude[l], std::fabs(v));
                     tw_[l] += a * (p - tw_[l]);
                     max_[l] = std::max(max_[l], tw_[l]);
                     min_[l] = std::min(min_[l], tw_[l]);
@@ -197,6 +241,63 @@ void BandLevels<W>::processFast(const float* frames, std::size_t count) {
             tick();
         }
     }
+    if (anyInterpolated_) refinePeaks(frames, count, magnitude);
+}
+
+template <std::size_t W>
+void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
+                                const std::array<float, W>& magnitude) {
+    // Frames -8 .. -1 from the previous call, then this call's. A sample is interpolated
+    // once four frames after it are known; the last four wait for the next call.
+    const std::size_t total = kHistory + count;
+    if (extended_.size() < total * W) extended_.resize(total * W);
+    std::copy(tail_.begin(), tail_.end(), extended_.begin());
+    std::copy(frames, frames + count * W,
+              extended_.begin() + static_cast<std::ptrdiff_t>(kHistory * W));
+    const std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
+    const std::size_t end = total - 4;
+    const QuarterKernels& k = quarterKernels();
+    const float* x = extended_.data();
+    // The crest is within half a sample of a sample at least cos(pi / 4) of it for content
+    // below a quarter of the rate: samples under 0.7 of the running peak need no look.
+    std::array<float, W> best{};
+    std::array<float, W> threshold{};
+    for (std::size_t l = 0; l < W; ++l) {
+        best[l] = std::max(truePeak_[l], peak_[l]);
+        threshold[l] = interpolate_[l] ? 0.7F * best[l] : std::numeric_limits<float>::infinity();
+    }
+    auto interpolateAround = [&](std::size_t j, std::size_t l) {
+        for (std::size_t base = j - 1; base <= j; ++base) {
+            for (int t = 0; t < 3; ++t) {
+                float s = 0.0F;
+                for (std::size_t i = 0; i < 8; ++i)
+                    s += k.h[t][i] * x[(base - 3 + i) * W + l];
+                best[l] = std::max(best[l], std::fabs(s));
+            }
+        }
+        best[l] = std::max(best[l], std::fabs(x[j * W + l]));
+        threshold[l] = 0.7F * best[l];
+    };
+    // Only lanes whose largest magnitude reaches the threshold need a look at the frames:
+    // the call's own frames (measured by the statistics kernel) and the ones waiting from
+    // the previous call.
+    std::array<float, W> largest = magnitude;
+    for (std::size_t j = begin; j < kHistory; ++j) {
+        for (std::size_t l = 0; l < W; ++l)
+            largest[l] = std::max(largest[l], std::fabs(x[j * W + l]));
+    }
+    for (std::size_t l = 0; l < W; ++l) {
+        if (!interpolate_[l] || largest[l] < threshold[l]) continue;
+        for (std::size_t j = begin; j < end; ++j) {
+            if (std::fabs(x[j * W + l]) >= threshold[l]) interpolateAround(j, l);
+        }
+    }
+    for (std::size_t l = 0; l < W; ++l) {
+        if (interpolate_[l]) truePeak_[l] = best[l];
+    }
+    std::copy(extended_.begin() + static_cast<std::ptrdiff_t>((total - kHistory) * W),
+              extended_.begin() + static_cast<std::ptrdiff_t>(total * W), tail_.begin());
+    tailSettled_ = true;
 }
 
 template <std::size_t W>
@@ -257,6 +358,15 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
             tick();
         }
     }
+    // The history for interpolation restarts with the fast path.
+    if (count >= kHistory) {
+        std::copy(frames + (count - kHistory) * W, frames + count * W, tail_.begin());
+    } else if (count > 0) {
+        std::copy(tail_.begin() + static_cast<std::ptrdiff_t>(count * W), tail_.end(),
+                  tail_.begin());
+        std::copy(frames, frames + count * W, tail_.end() - static_cast<std::ptrdiff_t>(count * W));
+    }
+    tailSettled_ = false;
 }
 
 template <std::size_t W>

@@ -8,7 +8,11 @@
 // - Ln: exceedance levels from a histogram of 0.1 dB classes of the time-weighted level
 //   taken every 10 ms of entered audio (100 per second; N: each 100 ms level once, which
 //   is the same distribution);
-// - Lpeak: largest absolute sample value;
+// - Lpeak: largest absolute value of the signal. For lanes whose content lies below a
+//   quarter of their rate it is looked for between samples too: samples within 3 dB of the
+//   running peak are interpolated at quarter-sample offsets (8-tap Lanczos), which finds
+//   the crest within 0.2 dB (a plain sample peak can miss it by 20 log10(cos(pi f / rate)),
+//   1.25 dB at a band's mid frequency). Other lanes take the largest sample;
 // - short Leqs: one Leq per call that asks for it (beginCall / endCall).
 //
 // Warm-up. A lane counts every sample it is given, pre-roll included, from reset. For its
@@ -22,6 +26,7 @@
 // counts only when it starts settled.
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <cstdint>
@@ -39,6 +44,8 @@ class BandLevels {
         bool active = false;
         double settleSeconds = 0.0;
         double primeSeconds = 0.0;
+        // The lane's content lies below a quarter of its rate: find crests between samples.
+        bool interpolatePeak = false;
     };
 
     BandLevels() = default;
@@ -63,7 +70,7 @@ class BandLevels {
     double leqPower(std::size_t lane) const;  // NaN when nothing was entered
     // Extremes as mean squares; false when no settled level was entered.
     bool extremes(std::size_t lane, double& minPower, double& maxPower) const;
-    float peak(std::size_t lane) const { return peak_[lane]; }
+    float peak(std::size_t lane) const { return std::max(peak_[lane], truePeak_[lane]); }
     void percentiles(std::size_t lane, const std::vector<float>& percents, float* out) const;
     std::uint64_t levelCount(std::size_t lane) const { return histogram_[lane].count(); }
     double seconds() const { return static_cast<double>(count_) / rate_; }
@@ -73,6 +80,8 @@ class BandLevels {
     void processFast(const float* frames, std::size_t count);
     void processSlow(const float* frames, std::size_t count, bool entering);
     void finishPriming(std::size_t lane);
+    // Interpolated peaks around the largest samples of settled frames.
+    void refinePeaks(const float* frames, std::size_t count, const std::array<float, W>& magnitude);
     void tick();
 
     unsigned code_ = 0;
@@ -81,6 +90,8 @@ class BandLevels {
     std::size_t tickSamples_ = 1;    // 10 ms
     std::size_t periodSamples_ = 1;  // 100 ms (N)
     std::array<bool, W> active_{};
+    std::array<bool, W> interpolate_{};
+    bool anyInterpolated_ = false;
     std::array<std::uint64_t, W> settleEnd_{};  // first sample after filter settling
     std::array<std::uint64_t, W> primeEnd_{};   // earliest first settled sample
 
@@ -103,7 +114,13 @@ class BandLevels {
     std::array<double, W> max_{};
     std::array<double, W> min_{};
     std::array<bool, W> hasExtremes_{};
+    std::array<float, W> truePeak_{};
     std::vector<LevelHistogram> histogram_;
+    // Last frames of the previous call (for interpolation across calls), and a work area.
+    static constexpr std::size_t kHistory = 8;
+    std::array<float, kHistory * W> tail_{};
+    bool tailSettled_ = false;
+    std::vector<float> extended_;
     std::uint64_t callCount_ = 0;
     std::array<double, W> callEnergy_{};
     std::vector<std::vector<Leq>> shortLeqs_;

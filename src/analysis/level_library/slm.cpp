@@ -201,6 +201,8 @@ void Slm::initBank(OctaveFilter::Bank kind, unsigned tw, unsigned fw, unsigned f
             const double fm = OctaveFilter::midBandFrequency(kind, b);
             lanes[l].primeSeconds = tw == TWeight::N ? 0.0 : primeSeconds(tw, fm);
             lanes[l].settleSeconds = bank->settle[b] - lanes[l].primeSeconds;
+            const double upperEdge = fm * std::pow(10.0, 0.15 / OctaveFilter::bandsPerOctave(kind));
+            lanes[l].interpolatePeak = upperEdge <= 0.25 * g.rate;
         }
         bank->levels.emplace_back(tw, g.rate, kRate, lanes);
     }

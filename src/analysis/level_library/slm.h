@@ -35,10 +35,11 @@
 // the call completed, which are exactly its own when n is a multiple of 32 (every whole
 // number of 100 ms periods is).
 //
-// Lpeak is the largest absolute sample of the band signal at the band's own rate; for a
-// tone at frequency f in a band computed at rate R it can read up to 20 log10(cos(pi f / R))
-// below the crest (at most 1.25 dB at a band's mid frequency; for the 48000 Hz filtered
-// channel 0.02 dB at 1 kHz, 1.25 dB at 8 kHz).
+// Lpeak is the crest of the band signal, found between its samples too (quarter-sample
+// interpolation around the largest samples, band_levels.h), within 0.2 dB, for every band
+// that lies below a quarter of its rate: all but the bands computed at 48000 Hz above
+// 11 kHz (third octaves 12.5, 16, 20 kHz; octave 16 kHz). Those and the filtered channel take
+// the largest sample at 48000 Hz, as a meter sampling at that rate does.
 //
 // Start-up. Each channel has a warm-up (band_levels.h): its filters first settle (40 dB
 // decay of the slowest pole on the way: frequency weighting, anti-alias stages, band
