@@ -7,6 +7,7 @@
 #include <cmath>
 #include <stdexcept>
 #include <string>
+#include <thread>
 
 #include "dsp.h"
 #include "signals.h"
@@ -247,6 +248,39 @@ TEST(MeterSetUp, RefusesBadValuesWithAReason) {
     EXPECT_THROW(slm.preRoll(x.data(), x.size()), std::logic_error);
     slm.resetAll();
     EXPECT_NO_THROW(slm.preRoll(x.data(), x.size()));
+}
+
+TEST(MeterThreads, MetersOnSeveralThreadsReadAsOneAlone) {
+    const std::vector<float> x = level_library_test::pinkNoise(3 * 48000, 77);
+    auto analyse = [&x](std::vector<level_library_test::Reading>& out) {
+        Slm slm(kFs, 1, 48000);
+        slm.initThirdOct(TWeight::F, FWeight::A, 0, 35, kFs, 0);
+        const float corners[2] = {200.0F, 2000.0F};
+        slm.initAuxCh(kBandPass, corners, TWeight::S, FWeight::C, kFs);
+        slm.setPercentiles({10.0F, 90.0F});
+        slm.resetAll();
+        feed(slm, x.data(), x.size(), true);
+        for (unsigned b = 0; b < kThirdOctaveBandCount; ++b)
+            out.push_back(readBand(slm, b));
+        out.push_back(readAux(slm));
+    };
+    std::vector<level_library_test::Reading> alone;
+    analyse(alone);
+    std::vector<std::vector<level_library_test::Reading>> together(3);
+    std::vector<std::thread> threads;
+    for (auto& r : together)
+        threads.emplace_back(analyse, std::ref(r));
+    for (std::thread& t : threads)
+        t.join();
+    for (const auto& r : together) {
+        ASSERT_EQ(r.size(), alone.size());
+        for (std::size_t i = 0; i < r.size(); ++i) {
+            EXPECT_EQ(r[i].leq, alone[i].leq);
+            EXPECT_EQ(r[i].lmax, alone[i].lmax);
+            EXPECT_EQ(r[i].lpeak, alone[i].lpeak);
+            EXPECT_EQ(r[i].levels, alone[i].levels);
+        }
+    }
 }
 
 // Peak-to-peak ripple (dB) of the exponentially averaged square of a steady sine.
