@@ -7,6 +7,7 @@
 #include <numbers>
 
 #include "dsp.h"
+#include "kernel_clones.h"
 #include "tweight.h"
 
 namespace SlmLibrary {
@@ -19,9 +20,10 @@ typedef double D4 __attribute__((vector_size(4 * sizeof(double))));
 // Settled statistics of eight lanes over `run` frames: energy, peak, exponential time
 // weighting and its extremes. The time weighting is y = (1 - a) y + a p, whose recursion is
 // one fused multiply-add per frame in the x86-64-v3 clone.
-__attribute__((target_clones("arch=x86-64-v3", "default"), optimize("fp-contract=fast"))) void
-settledRun8(const float* frames, std::size_t run, double a, double* energy, double* tw,
-            double* maxima, double* minima, float* peak, float* magnitude) {
+ORV_KERNEL_CLONES ORV_KERNEL_CONTRACT void settledRun8(const float* frames, std::size_t run,
+                                                       double a, double* energy, double* tw,
+                                                       double* maxima, double* minima, float* peak,
+                                                       float* magnitude) {
     D4 e[2], y[2], mx[2], mn[2];
     for (std::size_t h = 0; h < 2; ++h) {
         std::memcpy(&e[h], energy + 4 * h, sizeof(D4));

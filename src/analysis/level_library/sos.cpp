@@ -4,6 +4,8 @@
 #include <cstring>
 #include <stdexcept>
 
+#include "kernel_clones.h"
+
 namespace SlmLibrary {
 
 SosCascade::SosCascade(const SosList& sos) : coeffs_(sos), state_(sos.size()) {}
@@ -70,12 +72,11 @@ template <std::size_t K, bool Decimate>
 
 // The recursion of a section is two dependent multiply-adds per sample: fused
 // multiply-add (x86-64-v3 clone) halves its latency.
-#define ORV_CASCADE_KERNEL(NAME, K, DECIMATE)                                                 \
-    __attribute__((target_clones("arch=x86-64-v3", "default"), optimize("fp-contract=fast"))) \
-    std::size_t                                                                               \
-    NAME(const Sos* c, std::array<double, 2>* s, const float* in, std::size_t n, float* out,  \
-         bool& odd) {                                                                         \
-        return runCascade<K, DECIMATE>(c, s, in, n, out, odd);                                \
+#define ORV_CASCADE_KERNEL(NAME, K, DECIMATE)                                                      \
+    ORV_KERNEL_CLONES ORV_KERNEL_CONTRACT std::size_t NAME(const Sos* c, std::array<double, 2>* s, \
+                                                           const float* in, std::size_t n,         \
+                                                           float* out, bool& odd) {                \
+        return runCascade<K, DECIMATE>(c, s, in, n, out, odd);                                     \
     }
 ORV_CASCADE_KERNEL(cascade1, 1, false)
 ORV_CASCADE_KERNEL(cascade2, 2, false)
@@ -240,14 +241,12 @@ template <typename T, std::size_t K>
     }
 }
 
-// One entry point per (type, section count), compiled for x86-64-v3 (AVX2, FMA) and for
-// the baseline; the loader picks the clone that the processor supports. Contraction into
-// fused multiply-adds is allowed here (ISO C++ mode turns it off by default): it shortens
-// the recursion and changes results only in the last bit.
-#define ORV_LANE_KERNEL(NAME, T, K)                                                                \
-    __attribute__((target_clones("arch=x86-64-v3", "default"), optimize("fp-contract=fast"))) void \
-    NAME(const float* in, std::size_t n, float* out, const T* c, T* s1, T* s2) {                   \
-        runLanes<T, K>(in, n, out, c, s1, s2);                                                     \
+// One entry point per (type, section count), with the kernel attributes of
+// kernel_clones.h (instruction-set clones, fused multiply-adds).
+#define ORV_LANE_KERNEL(NAME, T, K)                                                             \
+    ORV_KERNEL_CLONES ORV_KERNEL_CONTRACT void NAME(const float* in, std::size_t n, float* out, \
+                                                    const T* c, T* s1, T* s2) {                 \
+        runLanes<T, K>(in, n, out, c, s1, s2);                                                  \
     }
 ORV_LANE_KERNEL(lanesF1, float, 1)
 ORV_LANE_KERNEL(lanesF2, float, 2)
