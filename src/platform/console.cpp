@@ -5,31 +5,18 @@
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
-#include <vector>
+
+#include "platform/format.h"
 
 namespace platform {
 
 void Console::print(const char* format, ...) {
-    char small[512];
+    std::string text;
     va_list args;
     va_start(args, format);
-    va_list copy;
-    va_copy(copy, args);
-    const int n = std::vsnprintf(small, sizeof small, format, args);
+    appendFormatV(text, format, args);
     va_end(args);
-    if (n < 0) {
-        va_end(copy);
-        return;
-    }
-    if (static_cast<std::size_t>(n) < sizeof small) {
-        va_end(copy);
-        write(small, static_cast<std::size_t>(n));
-        return;
-    }
-    std::vector<char> big(static_cast<std::size_t>(n) + 1);
-    std::vsnprintf(big.data(), big.size(), format, copy);
-    va_end(copy);
-    write(big.data(), static_cast<std::size_t>(n));
+    write(text.data(), text.size());
 }
 
 void Console::write(const char* text, std::size_t length) {

@@ -1,0 +1,11 @@
+// printf-style formatting appended to a string, whatever the length of the result.
+#pragma once
+
+#include <cstdarg>
+#include <string>
+
+namespace platform {
+
+void appendFormatV(std::string& out, const char* format, va_list args);
+
+}  // namespace platform
