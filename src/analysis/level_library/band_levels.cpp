@@ -13,55 +13,50 @@
 namespace SlmLibrary {
 namespace {
 
-typedef float F8 __attribute__((vector_size(8 * sizeof(float))));
-typedef float F4 __attribute__((vector_size(4 * sizeof(float))));
-typedef double D4 __attribute__((vector_size(4 * sizeof(double))));
-
 // Settled statistics of eight lanes over `run` frames: energy, peak, exponential time
-// weighting and its extremes. The time weighting is y = (1 - a) y + a p, whose recursion is
-// one fused multiply-add per frame in the x86-64-v3 clone.
-ORV_KERNEL_CLONES ORV_KERNEL_CONTRACT void settledRun8(const float* frames, std::size_t run,
-                                                       double a, double* energy, double* tw,
-                                                       double* maxima, double* minima, float* peak,
-                                                       float* magnitude) {
-    D4 e[2], y[2], mx[2], mn[2];
-    for (std::size_t h = 0; h < 2; ++h) {
-        std::memcpy(&e[h], energy + 4 * h, sizeof(D4));
-        std::memcpy(&y[h], tw + 4 * h, sizeof(D4));
-        std::memcpy(&mx[h], maxima + 4 * h, sizeof(D4));
-        std::memcpy(&mn[h], minima + 4 * h, sizeof(D4));
+// weighting and its extremes; `magnitude` collects the largest magnitude of the call. The
+// time weighting is y = (1 - a) y + a p, one fused multiply-add per frame in the x86-64-v3
+// clone. Written as fixed-width loops over the lanes, which the compiler turns into vector
+// operations of either width (explicit 8-wide selects would be split into scalar code
+// without AVX).
+ORV_KERNEL_CLONES ORV_KERNEL_CONTRACT void settledRun8(
+    const float* __restrict frames, std::size_t run, double a, double* __restrict energy,
+    double* __restrict tw, double* __restrict maxima, double* __restrict minima,
+    float* __restrict peak, float* __restrict magnitude) {
+    constexpr std::size_t L = 8;
+    double e[L], y[L], mx[L], mn[L];
+    float pk[L], mag[L];
+    for (std::size_t l = 0; l < L; ++l) {
+        e[l] = energy[l];
+        y[l] = tw[l];
+        mx[l] = maxima[l];
+        mn[l] = minima[l];
+        pk[l] = peak[l];
+        mag[l] = magnitude[l];
     }
-    F8 pk;
-    std::memcpy(&pk, peak, sizeof(F8));
-    F8 mag;
-    std::memcpy(&mag, magnitude, sizeof(F8));
-    const D4 gain = D4{} + a;
-    const D4 keep = D4{} + (1.0 - a);
+    const double keep = 1.0 - a;
     for (std::size_t k = 0; k < run; ++k) {
-        F8 v;
-        std::memcpy(&v, frames + 8 * k, sizeof(F8));
-        const F8 av = v < 0.0F ? -v : v;
-        pk = pk > av ? pk : av;
-        mag = mag > av ? mag : av;
-        const F4 half[2] = {__builtin_shufflevector(v, v, 0, 1, 2, 3),
-                            __builtin_shufflevector(v, v, 4, 5, 6, 7)};
-        for (std::size_t h = 0; h < 2; ++h) {
-            const D4 d = __builtin_convertvector(half[h], D4);
-            const D4 p = d * d;
-            e[h] += p;
-            y[h] = keep * y[h] + gain * p;
-            mx[h] = mx[h] > y[h] ? mx[h] : y[h];
-            mn[h] = mn[h] < y[h] ? mn[h] : y[h];
+        for (std::size_t l = 0; l < L; ++l) {
+            const float v = frames[k * L + l];
+            const float av = v < 0.0F ? -v : v;
+            pk[l] = pk[l] > av ? pk[l] : av;
+            mag[l] = mag[l] > av ? mag[l] : av;
+            const double d = v;
+            const double p = d * d;
+            e[l] += p;
+            y[l] = keep * y[l] + a * p;
+            mx[l] = mx[l] > y[l] ? mx[l] : y[l];
+            mn[l] = mn[l] < y[l] ? mn[l] : y[l];
         }
     }
-    for (std::size_t h = 0; h < 2; ++h) {
-        std::memcpy(energy + 4 * h, &e[h], sizeof(D4));
-        std::memcpy(tw + 4 * h, &y[h], sizeof(D4));
-        std::memcpy(maxima + 4 * h, &mx[h], sizeof(D4));
-        std::memcpy(minima + 4 * h, &mn[h], sizeof(D4));
+    for (std::size_t l = 0; l < L; ++l) {
+        energy[l] = e[l];
+        tw[l] = y[l];
+        maxima[l] = mx[l];
+        minima[l] = mn[l];
+        peak[l] = pk[l];
+        magnitude[l] = mag[l];
     }
-    std::memcpy(peak, &pk, sizeof(F8));
-    std::memcpy(magnitude, &mag, sizeof(F8));
 }
 
 // Lanczos (a = 4) interpolation at quarter-sample offsets t = 0.25, 0.5, 0.75 from the
