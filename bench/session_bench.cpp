@@ -38,17 +38,18 @@ const std::string& sessionRoot() {
             std::snprintf(name, sizeof name, "/data.000/20240305_%02d.csv", h);
             std::string text =
                 "Session Name,,Day\r\nLogger Serial Number,,4711\r\nDate,,05/03/2024\r\nHour,," +
-                std::to_string(h) + "\r\nTemperature,, 12.5\r\n"
+                std::to_string(h) +
+                "\r\nTemperature,, 12.5\r\n"
                 "Time,SPL-A,SPL-C,LEQ-A,LEQ-C,Signal Condition,Battery\r\n";
             text.reserve(text.size() + kRecordsPerHour * 44);
             for (std::size_t slot = 0; slot < kRecordsPerHour; ++slot) {
                 noise = noise * 1664525U + 1013904223U;
                 const double a = 45.0 + 10.0 * std::sin(static_cast<double>(slot) / 900.0) +
                                  static_cast<double>(noise >> 24) / 64.0;
-                const int n = std::snprintf(line.data(), line.size(), "%u:%u.%u,%.1f,%.1f,%.1f,%.1f,0,12.6\r\n",
-                                            static_cast<unsigned>(slot / 600),
-                                            static_cast<unsigned>(slot / 10 % 60),
-                                            static_cast<unsigned>(slot % 10), a, a + 12.0, a - 0.3, a + 11.7);
+                const int n = std::snprintf(
+                    line.data(), line.size(), "%u:%u.%u,%.1f,%.1f,%.1f,%.1f,0,12.6\r\n",
+                    static_cast<unsigned>(slot / 600), static_cast<unsigned>(slot / 10 % 60),
+                    static_cast<unsigned>(slot % 10), a, a + 12.0, a - 0.3, a + 11.7);
                 text.append(line.data(), static_cast<std::size_t>(n));
             }
             std::ofstream(session + name, std::ios::binary) << text;

@@ -60,12 +60,8 @@ void analyse(benchmark::State& state, bool third) {
         benchmark::Counter(samples / static_cast<double>(kRate), benchmark::Counter::kIsRate);
 }
 
-void BM_ThirdOctave36Bands_A_F_60s(benchmark::State& state) {
-    analyse(state, true);
-}
-void BM_Octave12Bands_A_F_60s(benchmark::State& state) {
-    analyse(state, false);
-}
+void BM_ThirdOctave36Bands_A_F_60s(benchmark::State& state) { analyse(state, true); }
+void BM_Octave12Bands_A_F_60s(benchmark::State& state) { analyse(state, false); }
 
 BENCHMARK(BM_ThirdOctave36Bands_A_F_60s)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_Octave12Bands_A_F_60s)->Unit(benchmark::kMillisecond);

@@ -14,7 +14,8 @@ namespace {
 
 int run(RunState& state, int argc, const char* const* argv, int vectorStartupStatus) {
     platform::Console& out = state.out;
-    if (initDefaults(state.settings, state.searchPaths, state.sessions, vectorStartupStatus, out) == 0) {
+    if (initDefaults(state.settings, state.searchPaths, state.sessions, vectorStartupStatus, out) ==
+        0) {
         return kExitRefused;
     }
     platform::makeStdoutUnbuffered();
@@ -27,7 +28,8 @@ int run(RunState& state, int argc, const char* const* argv, int vectorStartupSta
     pipe.open();
 
     out.print("Finding Sessions...\r\n");
-    const std::uint32_t found = findSessions(state.searchPaths, state.settings, state.sessions, out);
+    const std::uint32_t found =
+        findSessions(state.searchPaths, state.settings, state.sessions, out);
     out.print("Found %u Session(s)\r\n", found);
 
     std::uint32_t processed = 0;

@@ -98,7 +98,8 @@ constexpr const char* kUsage[] = {
     "-----  Session Type Handling Options -------\r\n",
     "          -trg <S/C>\r\n",
     "                           Triggered file handling type\r\n",
-    "                           S - Split - Statistics Results Given on Interval Time AND End-Of-File\r\n",
+    "                           S - Split - Statistics Results Given on Interval Time AND "
+    "End-Of-File\r\n",
     "                           C - Continual - Statistics Results given on End-Of-File only\r\n",
     "                           Defaults to Split type handling\r\n",
     "\r\n",
@@ -162,7 +163,9 @@ int Parser::run() {
         const std::size_t len = std::strlen(word);
         if (len != 2 && len != 4) return 0;
         // Each name is compared over its own length, so "-sabc" is "-s".
-        auto is = [&](const char* name) { return ::strncasecmp(word, name, std::strlen(name)) == 0; };
+        auto is = [&](const char* name) {
+            return ::strncasecmp(word, name, std::strlen(name)) == 0;
+        };
         if (is("-s")) {
             searchPaths();
         } else if (is("-p")) {
@@ -254,7 +257,8 @@ void Parser::interval(bool leq) {
     pos_ += 2;
     const char* what = leq ? "Leq interval" : "interval";
     long n = 0;
-    if (value == nullptr || !readWholeNumber(value, n) || n < 0 || n > static_cast<long>(UINT32_MAX)) {
+    if (value == nullptr || !readWholeNumber(value, n) || n < 0 ||
+        n > static_cast<long>(UINT32_MAX)) {
         out_.print("ERROR - %s is an invalid %s - Using default\r\n", value ? value : "", what);
         return;
     }
@@ -408,8 +412,9 @@ void Parser::triggered() {
     } else if (c == 'S' || c == 's') {
         s_.triggeredHandling = 0;
     } else {
-        out_.print("ERROR - %s is an invalid selection for triggered file handling - Using default\r\n",
-                   value ? value : "");
+        out_.print(
+            "ERROR - %s is an invalid selection for triggered file handling - Using default\r\n",
+            value ? value : "");
         s_.triggeredHandling = 0;
     }
 }

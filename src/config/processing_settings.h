@@ -26,7 +26,7 @@ enum class AuxFilterType : std::uint32_t {
 
 struct ProcessingSettings {
     std::uint32_t statsIntervalMin = 0;  // minutes; 0 stands for 60
-    std::uint32_t leqInterval = 0;  // seconds; 0 stands for 60; kLeqOff = no short Leq
+    std::uint32_t leqInterval = 0;       // seconds; 0 stands for 60; kLeqOff = no short Leq
     std::uint32_t generalWeighting = 0;  // frequency weighting code
     std::uint32_t octaveFreqWeighting = 0;
     std::uint32_t octaveTimeWeighting = 0;
@@ -34,17 +34,17 @@ struct ProcessingSettings {
     std::uint32_t auxFreqWeighting = 0;
     std::uint32_t auxTimeWeighting = 0;
     std::uint32_t auxFilterType = 0;  // AuxFilterType
-    float auxFreq1 = 0.0F;  // Hz
-    float auxFreq2 = 0.0F;  // Hz
+    float auxFreq1 = 0.0F;            // Hz
+    float auxFreq2 = 0.0F;            // Hz
     std::uint32_t auxBand1 = 0;
     std::uint32_t auxBand2 = 0;
     std::uint32_t rawLevelCsv = 0;
     std::uint32_t binMode = 0;
     std::uint32_t triggeredHandling = 0;  // 0 Split, 1 Continual
-    std::string outputDir;  // absolute, ends with the path separator
+    std::string outputDir;                // absolute, ends with the path separator
     std::uint32_t outputDirValid = 0;
     std::vector<float> percentiles;  // ascending
-    std::string pipeName;  // empty: no progress pipe
+    std::string pipeName;            // empty: no progress pipe
     std::uint32_t needWaveFiles = 0;
     std::uint32_t recursiveSearch = 0;
 

@@ -12,8 +12,8 @@
 namespace orv {
 
 const std::int32_t kAcceptedFilterFrequencies[kAcceptedFilterFrequencyCount] = {
-    25,   31,   40,   50,   63,   80,   100,  125,  160,   200,   250,   316,   400,   500,   630,
-    800,  1000, 1250, 1600, 2000, 2500, 3160, 4000, 5000, 6300, 8000, 10000, 12500, 16000, 20000};
+    25,  31,   40,   50,   63,   80,   100,  125,  160,  200,  250,  316,   400,   500,   630,
+    800, 1000, 1250, 1600, 2000, 2500, 3160, 4000, 5000, 6300, 8000, 10000, 12500, 16000, 20000};
 
 float bandEdge(std::size_t k) {
     return static_cast<float>(std::pow(10.0, 1.35 + static_cast<double>(k) / 10.0));

@@ -14,13 +14,11 @@ namespace {
 // when the line has no comma or fewer than two bytes of data follow it.
 bool skipToValue(const char*& pos, const char* end) {
     const char* p = pos;
-    while (p < end && *p != ',' && *p != '\n')
-        ++p;
+    while (p < end && *p != ',' && *p != '\n') ++p;
     if (p == end || *p != ',') return false;
     ++p;
     if (end - p < 2) return false;
-    while (p < end && (*p == ' ' || *p == '\t' || *p == ','))
-        ++p;
+    while (p < end && (*p == ' ' || *p == '\t' || *p == ',')) ++p;
     pos = p;
     return true;
 }
@@ -103,8 +101,7 @@ bool extractHeaderField(const char*& pos, const char* end, std::string& dest, st
     if (size == 0 || !skipToValue(pos, end)) return false;
     const char* const start = pos;
     const char* p = pos;
-    while (p < end && *p != '\n' && *p != ',' && static_cast<std::size_t>(p - start) < size)
-        ++p;
+    while (p < end && *p != '\n' && *p != ',' && static_cast<std::size_t>(p - start) < size) ++p;
     auto length = static_cast<std::size_t>(p - start);
     if (length > 0 && start[length - 1] == '\r') {
         --length;
@@ -159,8 +156,7 @@ void decodeLevelRecords(const char* data, std::size_t length, LevelRecordQueue& 
         LevelRecord record;
         if (!decodeRecord(p, end, record)) break;
         queue.records.push_back(record);
-        while (p < end && (*p == '\r' || *p == '\n'))
-            ++p;
+        while (p < end && (*p == '\r' || *p == '\n')) ++p;
     }
 }
 

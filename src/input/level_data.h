@@ -32,8 +32,8 @@ struct LevelRecord {
     float splC = 0.0F;
     float leqA = 0.0F;
     float leqC = 0.0F;
-    float battery = 0.0F;  // as written
-    std::uint32_t status = 0;  // 1 when the signal condition is 3 (overload)
+    float battery = 0.0F;         // as written
+    std::uint32_t status = 0;     // 1 when the signal condition is 3 (overload)
     std::uint32_t cond2Mark = 0;  // 1 when the signal condition is 2 (other gain range)
 };
 

@@ -8,9 +8,9 @@ namespace platform {
 
 struct SystemTime {
     std::uint16_t year = 0;
-    std::uint16_t month = 0;  // 1..12
+    std::uint16_t month = 0;      // 1..12
     std::uint16_t dayOfWeek = 0;  // 0 = Sunday; ignored on the way in
-    std::uint16_t day = 0;  // 1..31
+    std::uint16_t day = 0;        // 1..31
     std::uint16_t hour = 0;
     std::uint16_t minute = 0;
     std::uint16_t second = 0;

@@ -46,8 +46,7 @@ bool matchesPattern(const std::string& name, const std::string& pattern) {
     return wildcardMatch(name.c_str(), pattern.c_str());
 }
 
-bool listDirectory(const std::string& dir, const std::string& pattern,
-                   std::vector<DirEntry>& out) {
+bool listDirectory(const std::string& dir, const std::string& pattern, std::vector<DirEntry>& out) {
     out.clear();
     DIR* d = ::opendir(dir.empty() ? "." : dir.c_str());
     if (d == nullptr) return false;

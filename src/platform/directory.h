@@ -15,8 +15,7 @@ struct DirEntry {
 // `pattern`: '*' and '?' wildcards; "*.*" and "*" match every name. Matching ignores
 // ASCII case, as on the logger's media. "." and ".." never appear; entries come sorted by
 // name in byte order. False when the directory cannot be opened.
-bool listDirectory(const std::string& dir, const std::string& pattern,
-                   std::vector<DirEntry>& out);
+bool listDirectory(const std::string& dir, const std::string& pattern, std::vector<DirEntry>& out);
 bool matchesPattern(const std::string& name, const std::string& pattern);
 
 bool isDirectory(const std::string& path);

@@ -7,9 +7,7 @@ namespace {
 
 // strerror_r comes in two flavours: the GNU one returns the text, the XSI one fills the
 // buffer and returns a status. Overloads pick whichever this C library declares.
-[[maybe_unused]] const char* pickText(const char* result, const char* /*buffer*/) {
-    return result;
-}
+[[maybe_unused]] const char* pickText(const char* result, const char* /*buffer*/) { return result; }
 [[maybe_unused]] const char* pickText(int result, const char* buffer) {
     return result == 0 ? buffer : "Unknown error";
 }

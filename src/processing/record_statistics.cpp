@@ -101,7 +101,8 @@ bool RecordStatistics::stepGeneralStatistics(const LevelRecord& r, const DataFil
         return true;
     }
     const SlmLibrary::structResult result = generalStats_.getGenResults();
-    const int n = generalStats_.getPercentiles(row_.percentileValues.data(), row_.percentileValues.size());
+    const int n =
+        generalStats_.getPercentiles(row_.percentileValues.data(), row_.percentileValues.size());
     if (n <= 0) return true;
 
     row_.lmin = result.lmin;

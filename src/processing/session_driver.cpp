@@ -81,8 +81,7 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
             statistics.takeDispatchRequest();
         }
 
-        const float percent =
-            static_cast<float>(i + 1) / static_cast<float>(fileCount) * 100.0F;
+        const float percent = static_cast<float>(i + 1) / static_cast<float>(fileCount) * 100.0F;
         if (settings_.binMode != 0) {
             pipe.sendProgress(percent);
             out_.print("%s Complete\r\n", session.dataFiles[i].c_str());

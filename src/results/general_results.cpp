@@ -19,9 +19,9 @@ bool GeneralResultsWriter::writeAll(const std::string& text) {
 bool GeneralResultsWriter::writeHeader(const ResultHeaderInfo& info,
                                        std::uint32_t generalTimeWeighting) {
     if (!file_.valid()) return false;
-    const std::string block = formatHeaderBlock(info, kGeneralFirstLine,
-                                                SlmLibrary::FWeight::longName(info.generalWeighting),
-                                                SlmLibrary::TWeight::longName(generalTimeWeighting), 0);
+    const std::string block = formatHeaderBlock(
+        info, kGeneralFirstLine, SlmLibrary::FWeight::longName(info.generalWeighting),
+        SlmLibrary::TWeight::longName(generalTimeWeighting), 0);
     return writeAll(block) && writeAll("\"Date\",\"Time\",\"Leq\",\"Lmax\",") &&
            writeAll(percentileLabels(info.percentiles)) &&
            writeAll("\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r\n");

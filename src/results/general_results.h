@@ -21,7 +21,7 @@ struct GeneralIntervalRecord {
     float battery = 0.0F;
     float lmin = 0.0F;
     float lmax = 0.0F;
-    float leq = 0.0F;  // dB
+    float leq = 0.0F;                     // dB
     std::vector<float> percentileValues;  // one level per configured percentile
 };
 

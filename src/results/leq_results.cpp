@@ -42,10 +42,9 @@ bool LeqResultsWriter::formatHeader(LeqFileKind kind, const ResultHeaderInfo& in
                                      SlmLibrary::FWeight::longName(info.generalWeighting),
                                      averaging.data(), leqSeconds);
     } else {
-        f.header = formatHeaderBlock(info, kGeneralFirstLine,
-                                     SlmLibrary::FWeight::longName(info.octaveFreqWeighting),
-                                     SlmLibrary::TWeight::longName(info.octaveTimeWeighting),
-                                     leqSeconds);
+        f.header = formatHeaderBlock(
+            info, kGeneralFirstLine, SlmLibrary::FWeight::longName(info.octaveFreqWeighting),
+            SlmLibrary::TWeight::longName(info.octaveTimeWeighting), leqSeconds);
     }
     return true;
 }
@@ -98,7 +97,8 @@ bool LeqResultsWriter::writeRows(const std::vector<LeqRow>& rows) {
             all = false;
             continue;
         }
-        const LeqFileKind kind = row.levels.size() == 1 ? LeqFileKind::AllPass : LeqFileKind::Octave;
+        const LeqFileKind kind =
+            row.levels.size() == 1 ? LeqFileKind::AllPass : LeqFileKind::Octave;
         const std::string line = formatRow(row);
         all = addLineLocked(kind, line, pending[static_cast<std::size_t>(kind)]) && all;
     }
@@ -110,7 +110,8 @@ bool LeqResultsWriter::writeRows(const std::vector<LeqRow>& rows) {
     return all;
 }
 
-bool LeqResultsWriter::addLineLocked(LeqFileKind kind, const std::string& line, std::string& pending) {
+bool LeqResultsWriter::addLineLocked(LeqFileKind kind, const std::string& line,
+                                     std::string& pending) {
     LeqFile& f = file(kind);
     if (f.name.empty()) return false;  // that file was never opened in this session
     pending += line;

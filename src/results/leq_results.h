@@ -56,8 +56,8 @@ public:
 private:
     struct LeqFile {
         platform::File handle;
-        std::string name;  // part 0; the base of the roll-over names
-        std::string header;  // formatted header block
+        std::string name;             // part 0; the base of the roll-over names
+        std::string header;           // formatted header block
         std::uint32_t bandCount = 1;  // columns of the octave file
         std::uint32_t lines = 0;
         std::uint32_t part = 0;

@@ -57,7 +57,8 @@ std::string ResultNaming::leq(LeqFileKind kind, std::uint32_t octaveBandCount) c
     const char* suffix = kind == LeqFileKind::AllPass ? "" : octaveLabel(octaveBandCount);
     TextBuffer b;
     if (settings_.binMode == 0) {
-        b.append("%s%s_LEQ%s.csv", settings_.outputDir.c_str(), session_.sessionName.c_str(), suffix);
+        b.append("%s%s_LEQ%s.csv", settings_.outputDir.c_str(), session_.sessionName.c_str(),
+                 suffix);
     } else if (kind == LeqFileKind::AllPass) {
         b.append("%sLEQ%s_%s_%u_%s.csv", prefix().c_str(), suffix,
                  SlmLibrary::FWeight::shortName(settings_.generalWeighting),
@@ -94,7 +95,8 @@ std::string ResultNaming::filtered() const {
                  filterName(settings_.auxFilterType));
     } else {
         b.append("%s%s-%u-%u_%s_%u_%s.csv", prefix().c_str(), filterName(settings_.auxFilterType),
-                 static_cast<unsigned>(settings_.auxFreq1), static_cast<unsigned>(settings_.auxFreq2),
+                 static_cast<unsigned>(settings_.auxFreq1),
+                 static_cast<unsigned>(settings_.auxFreq2),
                  SlmLibrary::FWeight::shortName(settings_.auxFreqWeighting),
                  displayInterval(settings_.statsIntervalMin),
                  SlmLibrary::TWeight::shortName(settings_.auxTimeWeighting));
@@ -117,7 +119,8 @@ platform::File createResultFile(const std::string& path, platform::Console& out)
     } else {
         file = platform::createResultFile(path, &error);
     }
-    if (!file.valid()) out.print("Unable to open %s : %u\r\n", path.c_str(), static_cast<unsigned>(error));
+    if (!file.valid())
+        out.print("Unable to open %s : %u\r\n", path.c_str(), static_cast<unsigned>(error));
     return file;
 }
 

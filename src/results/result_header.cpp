@@ -20,7 +20,8 @@ std::string formatHeaderBlock(const ResultHeaderInfo& info, const std::string& f
              e.month, e.year, e.hour, e.minute, e.second);
     b.append("\"Frequency Weighting%s%s\"\r\n", kField, frequencyWeighting);
     b.append("\"Time Averaging%s%s\"\r\n", kField, timeAveraging);
-    b.append("\"Statistical Interval%s%u min\"\r\n", kField, displayInterval(info.statsIntervalMin));
+    b.append("\"Statistical Interval%s%u min\"\r\n", kField,
+             displayInterval(info.statsIntervalMin));
     b.append("\"Auxiliary Power%sNot Applicable\"\r\n", kField);
     b.append("\"Tape Recorder%sNot Applicable\"\r\n", kField);
     b.append("\"Short Term Leq%sNot Applicable\"\r\n", kField);

@@ -15,7 +15,7 @@ struct ResultHeaderInfo {
     static constexpr std::size_t kMaxTitle = 81;
 
     std::string serialNumber;  // cut to kMaxSerialNumber characters
-    std::string title;  // cut to kMaxTitle characters
+    std::string title;         // cut to kMaxTitle characters
     std::uint32_t generalWeighting = 0;
     std::uint32_t octaveFreqWeighting = 0;
     std::uint32_t statsIntervalMin = 0;
@@ -36,7 +36,8 @@ std::string formatHeaderBlock(const ResultHeaderInfo& info, const std::string& f
                               const char* frequencyWeighting, const char* timeAveraging,
                               std::uint32_t leqLengthSeconds);
 
-inline constexpr const char* kGeneralFirstLine = "\"Quellmark -  Type 1 Environmental Noise Logger\"\r\n";
+inline constexpr const char* kGeneralFirstLine =
+    "\"Quellmark -  Type 1 Environmental Noise Logger\"\r\n";
 
 // A percentile as a whole number, truncated toward zero (99.9 gives 99); values beyond the
 // range of int are clamped.

@@ -7,9 +7,7 @@
 
 namespace orv {
 
-inline bool isDecimalDigit(char c) {
-    return c >= '0' && c <= '9';
-}
+inline bool isDecimalDigit(char c) { return c >= '0' && c <= '9'; }
 
 // Reads an optional '-', a run of digits and optionally '.' with a run of digits, from
 // `text` up to `limit`. Every step is done in 32-bit float, so that the values match the

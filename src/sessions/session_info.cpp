@@ -12,9 +12,7 @@
 namespace orv {
 namespace {
 
-char upper(char c) {
-    return (c >= 'a' && c <= 'z') ? static_cast<char>(c - 'a' + 'A') : c;
-}
+char upper(char c) { return (c >= 'a' && c <= 'z') ? static_cast<char>(c - 'a' + 'A') : c; }
 
 // True when `text` begins with `prefix`, ignoring ASCII case.
 bool startsWithNoCase(std::string_view text, std::string_view prefix) {
@@ -70,8 +68,7 @@ InfoKey matchKey(std::string_view key) {
 const char* firstDigitAfterFirstChar(std::string_view line) {
     const char* const limit = line.data() + line.size();
     const char* p = line.empty() ? limit : line.data() + 1;
-    while (p < limit && !isDecimalDigit(*p))
-        ++p;
+    while (p < limit && !isDecimalDigit(*p)) ++p;
     return p;
 }
 
@@ -147,8 +144,7 @@ void handleLine(std::string_view line, SessionRecord& record, InfoReadState& sta
 void parseDateTime(std::string_view line, platform::SystemTime& time) {
     const char* p = line.data();
     const char* const limit = p + line.size();
-    while (p < limit && !isDecimalDigit(*p))
-        ++p;
+    while (p < limit && !isDecimalDigit(*p)) ++p;
     std::uint16_t* const fields[] = {&time.day,  &time.month,  &time.year,
                                      &time.hour, &time.minute, &time.second};
     for (std::uint16_t* field : fields) {

@@ -14,8 +14,8 @@ struct SessionRecord {
     static constexpr std::size_t kMaxNameLength = 79;
     static constexpr std::size_t kMaxPathLength = 259;
 
-    std::string sessionName;  // at most kMaxNameLength characters
-    std::string sessionPath;  // the session directory, ending with the path separator
+    std::string sessionName;            // at most kMaxNameLength characters
+    std::string sessionPath;            // the session directory, ending with the path separator
     std::uint32_t timeWeightingMs = 0;  // 125 (Fast) or n x 1000
     platform::SystemTime sessionStart;
     platform::SystemTime sessionEnd;

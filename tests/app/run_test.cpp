@@ -10,7 +10,8 @@ using testing_support::runToolProcess;
 using testing_support::TempDir;
 
 const std::string kStartup =
-    "Using Fast time weighting\r\nConfigured 8 percentiles\r\nUsing 15min statistics interval length\r\n";
+    "Using Fast time weighting\r\nConfigured 8 percentiles\r\nUsing 15min statistics interval "
+    "length\r\n";
 
 std::string usageText() {
     std::string text;
@@ -21,17 +22,20 @@ std::string usageText() {
 
 TEST(Usage, HasEightyStringsAndVersion) {
     const std::string usage = usageText();
-    EXPECT_EQ(usage.rfind("\r\nQuellmark\r\nOrvane - Telwa Session Post Processing Command Line Tool\r\n\r\n"
-                          "Version :  V3.60\r\n\r\n"
-                          "USAGE   :  orv_cmd [options] -s <session dir> -d <output dir>\r\n\r\n",
-                          0),
-              0U);
+    EXPECT_EQ(
+        usage.rfind(
+            "\r\nQuellmark\r\nOrvane - Telwa Session Post Processing Command Line Tool\r\n\r\n"
+            "Version :  V3.60\r\n\r\n"
+            "USAGE   :  orv_cmd [options] -s <session dir> -d <output dir>\r\n\r\n",
+            0),
+        0U);
     const std::string tail =
         "                           Defaults to Split type handling\r\n"
         "\r\n";
     ASSERT_GE(usage.size(), tail.size());
     EXPECT_EQ(usage.substr(usage.size() - tail.size()), tail);
-    EXPECT_NE(usage.find("        250, 316, 400, 500, 630, 800, 1000, 1250, 1600, 2000,\r\n"), std::string::npos);
+    EXPECT_NE(usage.find("        250, 316, 400, 500, 630, 800, 1000, 1250, 1600, 2000,\r\n"),
+              std::string::npos);
     EXPECT_EQ(usage.find("-npn"), std::string::npos);
     EXPECT_EQ(usage.find("-bin"), std::string::npos);
     EXPECT_EQ(usage.find("-csv"), std::string::npos);
@@ -59,7 +63,8 @@ TEST(Run, UnknownOptionAfterMessagesPrintsUsage) {
     TempDir dir;
     const auto r = runTool({"-s", dir.path(), "-i", "7", "-d", dir / "out", "-h"});
     EXPECT_EQ(r.status, -1);
-    EXPECT_EQ(r.output, kStartup + "ERROR - 7 is an invalid interval - Using default\r\n" + usageText());
+    EXPECT_EQ(r.output,
+              kStartup + "ERROR - 7 is an invalid interval - Using default\r\n" + usageText());
 }
 
 TEST(Run, EmptySearchReportsNoSessions) {
@@ -77,7 +82,9 @@ TEST(Run, EmptySearchReportsNoSessions) {
 
 TEST(Run, ProcessorMessageComesFirst) {
     const auto r = runTool({"-s", "x"}, 20);
-    EXPECT_EQ(r.output.rfind("MSG: Non Intel Processor found. px version of code was set\r\n" + kStartup, 0), 0U);
+    EXPECT_EQ(r.output.rfind(
+                  "MSG: Non Intel Processor found. px version of code was set\r\n" + kStartup, 0),
+              0U);
 }
 
 TEST(Run, EachRunStartsFromFreshState) {

@@ -31,7 +31,8 @@ protected:
         std::vector<const char*> argv{"orv_cmd"};
         for (const auto& a : args) argv.push_back(a.c_str());
         platform::Console console(&p.out);
-        p.ok = orv::parseCommandLine(static_cast<int>(argv.size()), argv.data(), p.s, p.paths, console);
+        p.ok = orv::parseCommandLine(static_cast<int>(argv.size()), argv.data(), p.s, p.paths,
+                                     console);
         return p;
     }
     // "-s <session> -d <out>" followed by the given options.
@@ -206,7 +207,8 @@ TEST_F(CommandLine, OutputDirectory) {
 TEST_F(CommandLine, OctaveOption) {
     Parsed p = parseWith({"-oct", "3", "Z", "S"});
     EXPECT_EQ(p.out,
-              "Enabled octave filter bank\r\nUsing Slow time weighting\r\nUsing Z frequency weighting\r\n");
+              "Enabled octave filter bank\r\nUsing Slow time weighting\r\nUsing Z frequency "
+              "weighting\r\n");
     EXPECT_EQ(p.s.octaveBandCount, 36U);
     EXPECT_EQ(p.s.octaveFreqWeighting, 0U);
     EXPECT_EQ(p.s.octaveTimeWeighting, 3U);
@@ -285,8 +287,9 @@ TEST_F(CommandLine, FilterOptions) {
     EXPECT_EQ(p.s.auxFilterType, 2U);
     EXPECT_EQ(p.s.auxBand1, 19U);
     p = parseWith({"-lpf", "1000", "A", "F", "-hpf", "999", "C", "S"});
-    EXPECT_EQ(p.out, "Enabled aux filter bank\r\n"
-                     "ERROR - 999 is an invalid frequency - Disabling Additional Filtering\r\n");
+    EXPECT_EQ(p.out,
+              "Enabled aux filter bank\r\n"
+              "ERROR - 999 is an invalid frequency - Disabling Additional Filtering\r\n");
     EXPECT_EQ(p.s.auxFilterType, 1U);
 
     p = parseWith({"-apf", "C", "S"});
@@ -295,8 +298,9 @@ TEST_F(CommandLine, FilterOptions) {
     p = parseWith({"-apf", "Z", "S"});
     EXPECT_EQ(p.out, "ERROR - Z is an invalid frequency - Disabling Additional Filtering\r\n");
     p = parseWith({"-apf", "Q", "S"});
-    EXPECT_EQ(p.out, "ERROR - Q is an invalid frequency weighting - Using default\r\n"
-                     "ERROR - Q is an invalid frequency - Disabling Additional Filtering\r\n");
+    EXPECT_EQ(p.out,
+              "ERROR - Q is an invalid frequency weighting - Using default\r\n"
+              "ERROR - Q is an invalid frequency - Disabling Additional Filtering\r\n");
     p = parse({"-s", session(), "-apf", "-d", out()});
     EXPECT_EQ(p.out, "ERROR - -d is an invalid frequency - Disabling Additional Filtering\r\n");
     EXPECT_EQ(p.ok, 1);  // the -d is still handled
@@ -312,10 +316,12 @@ TEST_F(CommandLine, TriggeredHandlingAndFlags) {
     EXPECT_EQ(p.out, "");
     p = parseWith({"-trg", "C", "-trg", "x"});
     EXPECT_EQ(p.s.triggeredHandling, 0U);
-    EXPECT_EQ(p.out, "ERROR - x is an invalid selection for triggered file handling - Using default\r\n");
+    EXPECT_EQ(p.out,
+              "ERROR - x is an invalid selection for triggered file handling - Using default\r\n");
     p = parse({"-s", session(), "-trg", "-d", out()});
     EXPECT_EQ(p.ok, 1);
-    EXPECT_EQ(p.out, "ERROR - -d is an invalid selection for triggered file handling - Using default\r\n");
+    EXPECT_EQ(p.out,
+              "ERROR - -d is an invalid selection for triggered file handling - Using default\r\n");
 
     p = parseWith({"-bin", "-csv", "-npn", "front"});
     EXPECT_EQ(p.s.binMode, 1U);

@@ -111,7 +111,9 @@ TEST(StartUp, DefaultsAndTheirMessages) {
 
     out.clear();
     ASSERT_EQ(orv::initDefaults(s, paths, table, 20, console), 1);
-    EXPECT_EQ(out.rfind("MSG: Non Intel Processor found. px version of code was set\r\nUsing Fast", 0), 0U);
+    EXPECT_EQ(
+        out.rfind("MSG: Non Intel Processor found. px version of code was set\r\nUsing Fast", 0),
+        0U);
 
     orv::releaseLists(s, paths, table);
     EXPECT_EQ(s.percentileCount(), 0U);

@@ -119,12 +119,8 @@ void checkMidBandLevels(bool third) {
     }
 }
 
-TEST(BandLevels, ASineAtMidBandReadsItsLevelInEveryThirdOctaveBand) {
-    checkMidBandLevels(true);
-}
-TEST(BandLevels, ASineAtMidBandReadsItsLevelInEveryOctaveBand) {
-    checkMidBandLevels(false);
-}
+TEST(BandLevels, ASineAtMidBandReadsItsLevelInEveryThirdOctaveBand) { checkMidBandLevels(true); }
+TEST(BandLevels, ASineAtMidBandReadsItsLevelInEveryOctaveBand) { checkMidBandLevels(false); }
 
 // The band powers of broadband noise add up to the power of the noise.
 TEST(BandLevels, BandPowersOfWhiteAndPinkNoiseSumToTheBroadbandPower) {
@@ -146,8 +142,7 @@ TEST(BandLevels, BandPowersOfWhiteAndPinkNoiseSumToTheBroadbandPower) {
             slm.preRoll(x.data(), 4 * 48000);
             feed(slm, x.data() + 4 * 48000, n - 4 * 48000);
             double sum = 0.0;
-            for (unsigned b = 0; b <= last; ++b)
-                sum += std::pow(10.0, readBand(slm, b).leq / 10.0);
+            for (unsigned b = 0; b <= last; ++b) sum += std::pow(10.0, readBand(slm, b).leq / 10.0);
             EXPECT_NEAR(10.0 * std::log10(sum), broadband, 0.3)
                 << (pink ? "pink" : "white") << (third ? " third octaves" : " octaves");
         }

@@ -45,8 +45,7 @@ inline CsvTable readReference(const std::string& file) {
         std::vector<std::string> fields;
         std::stringstream ss(line);
         std::string field;
-        while (std::getline(ss, field, ','))
-            fields.push_back(field);
+        while (std::getline(ss, field, ',')) fields.push_back(field);
         if (line.back() == ',') fields.emplace_back();
         if (t.columns.empty()) {
             t.columns = fields;

@@ -71,8 +71,7 @@ inline void bandLimit(std::vector<float>& x, double lo, double hi) {
 
 inline double meanSquareDb(const std::vector<float>& x, std::size_t from = 0) {
     double s = 0.0;
-    for (std::size_t i = from; i < x.size(); ++i)
-        s += static_cast<double>(x[i]) * x[i];
+    for (std::size_t i = from; i < x.size(); ++i) s += static_cast<double>(x[i]) * x[i];
     return 10.0 * std::log10(s / static_cast<double>(x.size() - from));
 }
 

@@ -24,9 +24,7 @@ using level_library_test::sine;
 
 const float kNoCorners[2] = {0.0F, 0.0F};
 
-double db(double amplitude) {
-    return 20.0 * std::log10(amplitude);
-}
+double db(double amplitude) { return 20.0 * std::log10(amplitude); }
 
 // Filtered channel, all-pass, Z: the statistics of the plain signal.
 Slm plainMeter(unsigned tw) {
@@ -40,8 +38,7 @@ Slm plainMeter(unsigned tw) {
 TEST(MeterStatistics, LevelStepGivesExtremesPercentilesAndEnergyMean) {
     // 1 kHz tone, 5 s at 60 dB then 5 s at 80 dB (re 1).
     std::vector<float> x = sine(1000.0, std::sqrt(2.0) * 1000.0, 10 * 48000);
-    for (std::size_t i = 5 * 48000; i < x.size(); ++i)
-        x[i] *= 10.0F;
+    for (std::size_t i = 5 * 48000; i < x.size(); ++i) x[i] *= 10.0F;
     for (const unsigned tw : {TWeight::F, TWeight::S, TWeight::N}) {
         SCOPED_TRACE(TWeight::longName(tw));
         Slm slm = plainMeter(tw);
@@ -149,8 +146,7 @@ TEST(MeterStatistics, ShortLeqHoldsExactlyEachCallsSamples) {
     EXPECT_NEAR(Dsp::powerToDb(pooled.meanPower()), 10.0 * std::log10((1e6 + 0.5e7 + 1e8) / 2.5),
                 0.01);
     // Every band gets one entry per asking call; the 1 kHz band follows the tone.
-    for (unsigned b = 0; b <= 11; ++b)
-        EXPECT_EQ(slm.getShortLeq(b).size(), 3U);
+    for (unsigned b = 0; b <= 11; ++b) EXPECT_EQ(slm.getShortLeq(b).size(), 3U);
     EXPECT_NEAR(Dsp::powerToDb(slm.getShortLeq(7)[2].meanPower()), 80.0, 0.1);
 }
 
@@ -260,18 +256,15 @@ TEST(MeterThreads, MetersOnSeveralThreadsReadAsOneAlone) {
         slm.setPercentiles({10.0F, 90.0F});
         slm.resetAll();
         feed(slm, x.data(), x.size(), true);
-        for (unsigned b = 0; b < kThirdOctaveBandCount; ++b)
-            out.push_back(readBand(slm, b));
+        for (unsigned b = 0; b < kThirdOctaveBandCount; ++b) out.push_back(readBand(slm, b));
         out.push_back(readAux(slm));
     };
     std::vector<level_library_test::Reading> alone;
     analyse(alone);
     std::vector<std::vector<level_library_test::Reading>> together(3);
     std::vector<std::thread> threads;
-    for (auto& r : together)
-        threads.emplace_back(analyse, std::ref(r));
-    for (std::thread& t : threads)
-        t.join();
+    for (auto& r : together) threads.emplace_back(analyse, std::ref(r));
+    for (std::thread& t : threads) t.join();
     for (const auto& r : together) {
         ASSERT_EQ(r.size(), alone.size());
         for (std::size_t i = 0; i < r.size(); ++i) {
@@ -335,8 +328,7 @@ TEST(MeterStartUp, ASteadyToneReadsSteadyFromTheFirstBlockInEveryOctaveBand) {
 void checkBlockAgainstContinuous(unsigned tw, double preRollSeconds) {
     const std::size_t minute = 60 * 48000;
     std::vector<float> x = level_library_test::pinkNoise(2 * minute, 4242);
-    for (float& v : x)
-        v *= 1000.0F;
+    for (float& v : x) v *= 1000.0F;
     auto setUp = [&](Slm& slm) {
         slm.initThirdOct(tw, FWeight::A, 0, 35, kFs, 0);
         slm.setPercentiles({10.0F, 50.0F, 90.0F});
@@ -361,8 +353,7 @@ void checkBlockAgainstContinuous(unsigned tw, double preRollSeconds) {
         EXPECT_NEAR(k.leq, c.leq, 0.2);
         EXPECT_NEAR(k.lmax, c.lmax, 0.2);
         EXPECT_NEAR(k.lmin, c.lmin, 0.2);
-        for (std::size_t i = 0; i < 3; ++i)
-            EXPECT_NEAR(k.levels[i], c.levels[i], 0.2);
+        for (std::size_t i = 0; i < 3; ++i) EXPECT_NEAR(k.levels[i], c.levels[i], 0.2);
     }
 }
 

@@ -57,10 +57,8 @@ TEST(DbConversion, NoPowerReadsZeroDecibels) {
 
 TEST(LevelDistribution, LnIsTheClassReachedOrExceededByNPercent) {
     LevelHistogram h;
-    for (int i = 0; i < 50; ++i)
-        h.add(60.0F);
-    for (int i = 0; i < 50; ++i)
-        h.add(70.0F);
+    for (int i = 0; i < 50; ++i) h.add(60.0F);
+    for (int i = 0; i < 50; ++i) h.add(70.0F);
     EXPECT_FLOAT_EQ(h.exceedanceLevel(10.0), 70.0F);
     EXPECT_FLOAT_EQ(h.exceedanceLevel(50.0), 70.0F);
     EXPECT_FLOAT_EQ(h.exceedanceLevel(90.0), 60.0F);
@@ -68,8 +66,7 @@ TEST(LevelDistribution, LnIsTheClassReachedOrExceededByNPercent) {
     EXPECT_FLOAT_EQ(h.exceedanceLevel(50.1), 60.0F);
 
     LevelHistogram constant;
-    for (int i = 0; i < 7; ++i)
-        constant.add(63.4F);
+    for (int i = 0; i < 7; ++i) constant.add(63.4F);
     for (const double n : {1.0, 33.3, 50.0, 99.0})
         EXPECT_FLOAT_EQ(constant.exceedanceLevel(n), 63.4F);
 
@@ -109,8 +106,7 @@ TEST(IntervalStatistics, ReportsLeqExtremesAndPercentilesOfTheEnteredLevels) {
     EXPECT_FLOAT_EQ(r.lmax, 59.0F);
     EXPECT_EQ(r.overload, 1U);
     double energy = 0.0;
-    for (int i = 0; i < 10; ++i)
-        energy += std::pow(10.0, (50.0 + i) / 10.0);
+    for (int i = 0; i < 10; ++i) energy += std::pow(10.0, (50.0 + i) / 10.0);
     EXPECT_NEAR(r.leq, 10.0 * std::log10(energy / 10.0), 1e-4);
 
     s.reset();

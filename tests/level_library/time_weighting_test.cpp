@@ -15,9 +15,7 @@ namespace {
 using level_library_test::readReference;
 constexpr double kFs = 48000.0;
 
-double db(double power) {
-    return 10.0 * std::log10(power);
-}
+double db(double power) { return 10.0 * std::log10(power); }
 
 TEST(TimeWeighting, DecayRatesAreInsideClass1) {
     struct Case {
@@ -84,10 +82,8 @@ TEST(TimeWeighting, NoneGivesTheEquivalentLevelOfEach100msPeriod) {
     // 100 ms at mean square 2, then 100 ms at mean square 4, at a decimated rate of 3000 Hz.
     TWeight tw(TWeight::N, kFs, 3000.0);
     std::vector<float> sq(600);
-    for (std::size_t i = 0; i < 300; ++i)
-        sq[i] = (i % 2 == 0) ? 1.0F : 3.0F;
-    for (std::size_t i = 300; i < 600; ++i)
-        sq[i] = 4.0F;
+    for (std::size_t i = 0; i < 300; ++i) sq[i] = (i % 2 == 0) ? 1.0F : 3.0F;
+    for (std::size_t i = 300; i < 600; ++i) sq[i] = 4.0F;
     tw.Process(sq.data(), sq.size());
     EXPECT_FLOAT_EQ(sq[299], 2.0F);
     EXPECT_FLOAT_EQ(sq[599], 4.0F);

@@ -96,8 +96,7 @@ TEST(FrequencyWeighting, SingleOutputsMatchProcessAllAndKeepStateBetweenCalls) {
         std::copy(in.begin() + 4001, in.end(), out.begin() + 4001);
         single.Process(out.data() + 4001, out.data() + 4001, in.size() - 4001);
         const std::vector<float>& ref = code == FWeight::A ? a : c;
-        for (std::size_t i = 0; i < in.size(); ++i)
-            ASSERT_EQ(out[i], ref[i]) << i;
+        for (std::size_t i = 0; i < in.size(); ++i) ASSERT_EQ(out[i], ref[i]) << i;
     }
     FWeight z(kFs);
     std::vector<float> out(in.size());

@@ -63,8 +63,7 @@ TEST(DemoCommandLine, RefusedInput) {
     };
     for (const Args& args : refused) {
         std::string line;
-        for (const std::string& a : args)
-            line += a + " ";
+        for (const std::string& a : args) line += a + " ";
         EXPECT_NE(parseCommandLine(args).error, "") << line;
     }
     EXPECT_EQ(parseCommandLine({"--duration", "86400", "--split-wave", "3600"}).error, "");

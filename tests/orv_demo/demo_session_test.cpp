@@ -101,8 +101,7 @@ std::vector<Row> allRows(const std::string& dataDir) {
 
 double energyMeanDb(const std::vector<Row>& rows, double Row::*level) {
     double sum = 0.0;
-    for (const Row& r : rows)
-        sum += std::pow(10.0, 0.1 * (r.*level));
+    for (const Row& r : rows) sum += std::pow(10.0, 0.1 * (r.*level));
     return 10.0 * std::log10(sum / static_cast<double>(rows.size()));
 }
 
@@ -137,15 +136,13 @@ double weightingPower(bool a, double f) {
 // analog definition: independent of the level library's filters.
 double weightedLeqDb(const std::vector<std::int16_t>& samples, float gain, bool aWeighting) {
     std::size_t n = 1;
-    while (n < samples.size())
-        n *= 2;
+    while (n < samples.size()) n *= 2;
     std::vector<std::complex<double>> x(n);
     for (std::size_t i = 0; i < samples.size(); ++i)
         x[i] = static_cast<double>(static_cast<float>(samples[i]) * gain);
     for (std::size_t i = 1, j = 0; i < n; ++i) {  // bit-reversal permutation
         std::size_t bit = n >> 1;
-        for (; j & bit; bit >>= 1)
-            j ^= bit;
+        for (; j & bit; bit >>= 1) j ^= bit;
         j ^= bit;
         if (i < j) std::swap(x[i], x[j]);
     }
@@ -180,7 +177,7 @@ DemoOptions shortSession(const std::string& outDir) {
 }
 
 class DemoSessionTest : public ::testing::Test {
-  protected:
+protected:
     static void SetUpTestSuite() {
         tmp_ = new testing_support::TempDir;
         summary_ = new DemoSummary(generateDemoSession(shortSession(tmp_->path())));

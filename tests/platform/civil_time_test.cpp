@@ -88,7 +88,8 @@ TEST(CivilTime, LeapYears) {
     EXPECT_TRUE(platform::systemTimeToFileTime(make(2000, 2, 29), f));
     EXPECT_FALSE(platform::systemTimeToFileTime(make(1900, 2, 29), f));
     EXPECT_FALSE(platform::systemTimeToFileTime(make(2023, 2, 29), f));
-    EXPECT_EQ(ticks(make(2024, 3, 1)) - ticks(make(2024, 2, 28)), 2 * 86400 * platform::kTicksPerSecond);
+    EXPECT_EQ(ticks(make(2024, 3, 1)) - ticks(make(2024, 2, 28)),
+              2 * 86400 * platform::kTicksPerSecond);
 }
 
 TEST(CivilTime, EveryInvalidFieldFails) {

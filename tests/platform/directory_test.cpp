@@ -25,9 +25,9 @@ TEST(DirectoryListing, SortedByteOrderWithoutDotEntries) {
     testing_support::makeDirs(dir / "Data.001");
     std::vector<platform::DirEntry> entries;
     ASSERT_TRUE(platform::listDirectory(dir.path(), "*.*", entries));
-    EXPECT_EQ(names(entries), (std::vector<std::string>{"B.csv", "Data.001/", "_x.csv", "a.CSV",
-                                                        "a10.csv", "a2.csv", "b.csv", "c.txt",
-                                                        "data.000/"}));
+    EXPECT_EQ(names(entries),
+              (std::vector<std::string>{"B.csv", "Data.001/", "_x.csv", "a.CSV", "a10.csv",
+                                        "a2.csv", "b.csv", "c.txt", "data.000/"}));
     ASSERT_TRUE(platform::listDirectory(dir.path(), "*.csv", entries));
     EXPECT_EQ(names(entries),
               (std::vector<std::string>{"B.csv", "_x.csv", "a.CSV", "a10.csv", "a2.csv", "b.csv"}));
@@ -61,7 +61,8 @@ TEST(Directories, CreateAndResolve) {
     EXPECT_EQ(platform::makeDirectory(dir / "out"), platform::MakeDirResult::Created);
     EXPECT_EQ(platform::makeDirectory(dir / "out"), platform::MakeDirResult::AlreadyExists);
     int error = 0;
-    EXPECT_EQ(platform::makeDirectory(dir / "missing/deeper", &error), platform::MakeDirResult::Failed);
+    EXPECT_EQ(platform::makeDirectory(dir / "missing/deeper", &error),
+              platform::MakeDirResult::Failed);
     EXPECT_NE(error, 0);
 
     std::string canonical;

@@ -80,7 +80,8 @@ TEST_F(SessionRun, ConstantLevelsComeBackAsEveryStatistic) {
     const RunResult r = run({"-i", "1"});
     ASSERT_EQ(r.status, 0) << r.output;
     EXPECT_NE(r.output.find("Found 1 Session(s)\r\n"), std::string::npos);
-    EXPECT_NE(r.output.find("100.0 % Complete\r\n\r\n\r\nProcessed 1 out of 1 sessions\r\n"), std::string::npos)
+    EXPECT_NE(r.output.find("100.0 % Complete\r\n\r\n\r\nProcessed 1 out of 1 sessions\r\n"),
+              std::string::npos)
         << r.output;
 
     const auto data = rows(result("Quiet.csv"));
@@ -109,13 +110,13 @@ TEST_F(SessionRun, MixOfTwoLevelsGivesEnergyMeanAndPercentiles) {
     const auto& f = data[0];
     const double leq = 10.0 * std::log10(0.25 * 1e7 + 0.75 * 1e5);
     EXPECT_EQ(f[2], (std::ostringstream() << std::fixed << std::setprecision(1) << leq).str());
-    EXPECT_EQ(f[3], "70.0");  // Lmax
-    EXPECT_EQ(f[4], "70.0");  // L1
-    EXPECT_EQ(f[5], "70.0");  // L10
-    EXPECT_EQ(f[6], "70.0");  // L25: reached by exactly a quarter of the records
-    EXPECT_EQ(f[7], "50.0");  // L26
-    EXPECT_EQ(f[8], "50.0");  // L50
-    EXPECT_EQ(f[9], "50.0");  // L90
+    EXPECT_EQ(f[3], "70.0");   // Lmax
+    EXPECT_EQ(f[4], "70.0");   // L1
+    EXPECT_EQ(f[5], "70.0");   // L10
+    EXPECT_EQ(f[6], "70.0");   // L25: reached by exactly a quarter of the records
+    EXPECT_EQ(f[7], "50.0");   // L26
+    EXPECT_EQ(f[8], "50.0");   // L50
+    EXPECT_EQ(f[9], "50.0");   // L90
     EXPECT_EQ(f[10], "50.0");  // Lmin
     EXPECT_EQ(headerLines(result("Mix.csv"))[20],
               "\"Date\",\"Time\",\"Leq\",\"Lmax\",\"L1\",\"L10\",\"L25\",\"L26\",\"L50\",\"L90\","
@@ -199,8 +200,8 @@ TEST_F(SessionRun, BatteryIsTheIntervalsLowestReadingAndOverloadCoversTheInterva
 TEST_F(SessionRun, ShortLeqRowsReachTheirSessionsFile) {
     SessionLayout layout = namedSession("Leq");
     // 0:0.1 .. 2:25.0: two whole minutes and 25 s; 10 s intervals with a level per interval.
-    layout.levelFiles[0].rows =
-        levelRows(1, 1450, [](std::size_t slot) { return 40.0F + static_cast<float>((slot - 1) / 100); });
+    layout.levelFiles[0].rows = levelRows(
+        1, 1450, [](std::size_t slot) { return 40.0F + static_cast<float>((slot - 1) / 100); });
     layout.levelFiles[0].rows[150].condition = 3;  // overload in the second 10 s interval
     addSession(layout, "Leq");
     ASSERT_EQ(run({"-i", "1", "-leq", "10"}).status, 0);
@@ -222,12 +223,14 @@ TEST_F(SessionRun, ShortLeqRowsReachTheirSessionsFile) {
 
 TEST_F(SessionRun, TwoSessionsInOneRunGiveTheFilesOfTwoSeparateRuns) {
     SessionLayout a = namedSession("Alpha");
-    auto rowsA = levelRows(1, 1250, [](std::size_t slot) { return 50.0F + static_cast<float>(slot % 7); });
+    auto rowsA =
+        levelRows(1, 1250, [](std::size_t slot) { return 50.0F + static_cast<float>(slot % 7); });
     rowsA.erase(rowsA.begin() + 1240);  // a gap near the end of the first session
     rowsA[1245].battery = 11.0F;
     a.levelFiles[0].rows = rowsA;
     SessionLayout b = namedSession("Beta");
-    b.levelFiles[0].rows = levelRows(3001, 4800, [](std::size_t slot) { return 45.0F + static_cast<float>(slot % 3); });
+    b.levelFiles[0].rows = levelRows(
+        3001, 4800, [](std::size_t slot) { return 45.0F + static_cast<float>(slot % 3); });
     addSession(a, "Alpha");
     addSession(b, "Beta");
     ASSERT_EQ(run({"-i", "1", "-leq", "4"}).status, 0);
@@ -236,7 +239,8 @@ TEST_F(SessionRun, TwoSessionsInOneRunGiveTheFilesOfTwoSeparateRuns) {
 
     TempDir alone;
     writeSession(alone / "sessions/Beta", b);
-    ASSERT_EQ(runTool({"-s", alone / "sessions", "-d", alone / "out", "-i", "1", "-leq", "4"}).status, 0);
+    ASSERT_EQ(
+        runTool({"-s", alone / "sessions", "-d", alone / "out", "-i", "1", "-leq", "4"}).status, 0);
     EXPECT_EQ(readFile(alone / "out/Beta.csv"), together);
     EXPECT_EQ(readFile(alone / "out/Beta_LEQ.csv"), togetherLeq);
     EXPECT_EQ(rows(result("Beta.csv"))[0].size(), 16U);  // no gap mark carried over
@@ -280,9 +284,10 @@ TEST_F(SessionRun, ProgressLinesInBothLayouts) {
               std::string::npos)
         << r.output;
     r = run({"-bin"});
-    EXPECT_NE(r.output.find("data.000/20200917_08.csv Complete\r\ndata.000/20200917_09.csv Complete\r\n"
-                            "data.000/20200917_10.csv Complete\r\n\r\n"),
-              std::string::npos)
+    EXPECT_NE(
+        r.output.find("data.000/20200917_08.csv Complete\r\ndata.000/20200917_09.csv Complete\r\n"
+                      "data.000/20200917_10.csv Complete\r\n\r\n"),
+        std::string::npos)
         << r.output;
 }
 

@@ -60,10 +60,11 @@ TEST(GeneralResults, HeaderBlockAndColumnLine) {
     ASSERT_TRUE(writer.open(dir / "S1.csv"));
     ASSERT_TRUE(writer.writeHeader(sampleInfo(), 2));
     writer.close();
-    EXPECT_EQ(readFile(dir / "S1.csv"),
-              std::string(kGeneralHeader) +
-                  "\"Date\",\"Time\",\"Leq\",\"Lmax\",\"L1\",\"L5\",\"L10\",\"L25\",\"L50\",\"L75\","
-                  "\"L90\",\"L99\",\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r\n");
+    EXPECT_EQ(
+        readFile(dir / "S1.csv"),
+        std::string(kGeneralHeader) +
+            "\"Date\",\"Time\",\"Leq\",\"Lmax\",\"L1\",\"L5\",\"L10\",\"L25\",\"L50\",\"L75\","
+            "\"L90\",\"L99\",\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r\n");
     EXPECT_EQ(console, "");
     EXPECT_EQ(orv::percentileLabels({33.3F, 66.7F, 0.5F}), "\"L33\",\"L66\",\"L0\",");
     EXPECT_FALSE(orv::GeneralResultsWriter(out).writeHeader(sampleInfo(), 2));  // not open
@@ -130,15 +131,17 @@ TEST(LeqResults, HeadersOfBothFiles) {
     std::string expected = kGeneralHeader;
     replaceLine(expected, "\"Time Averaging", kLeqAllPassLine7);
     replaceLine(expected, "\"Short Term Leq Length", kLeqLine12);
-    EXPECT_EQ(readFile(dir / "S1_LEQ.csv"), expected + "\"Date\",\"Time\",\"AP Leq\",\"Overload\"\r\n");
+    EXPECT_EQ(readFile(dir / "S1_LEQ.csv"),
+              expected + "\"Date\",\"Time\",\"AP Leq\",\"Overload\"\r\n");
 
     const std::string octave = readFile(dir / "S1_LEQ1OCT.csv");
     EXPECT_NE(octave.find("\"Frequency Weighting\",\"\",\"\",\"\",\"C\"\r\n"), std::string::npos);
     EXPECT_NE(octave.find("\"Time Averaging\",\"\",\"\",\"\",\"Slow\"\r\n"), std::string::npos);
-    EXPECT_NE(octave.find("\r\n\r\n\"Date\",\"Time\",\"8Hz\",\"16Hz\",\"31.5Hz\",\"63Hz\",\"125Hz\","
-                          "\"250Hz\",\"500Hz\",\"1kHz\",\"2kHz\",\"4kHz\",\"8kHz\",\"16kHz\","
-                          "\"Overload\"\r\n"),
-              std::string::npos);
+    EXPECT_NE(
+        octave.find("\r\n\r\n\"Date\",\"Time\",\"8Hz\",\"16Hz\",\"31.5Hz\",\"63Hz\",\"125Hz\","
+                    "\"250Hz\",\"500Hz\",\"1kHz\",\"2kHz\",\"4kHz\",\"8kHz\",\"16kHz\","
+                    "\"Overload\"\r\n"),
+        std::string::npos);
 }
 
 TEST(LeqResults, RowsGoToTheFileTheirLevelCountSelects) {
@@ -210,7 +213,8 @@ TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
     orv::LeqResultsWriter writer(out, 121);  // 100 rows per part
     orv::ResultHeaderInfo info = sampleInfo();
     for (auto kind : {orv::LeqFileKind::AllPass, orv::LeqFileKind::Octave}) {
-        ASSERT_TRUE(writer.open(kind, dir / (kind == orv::LeqFileKind::AllPass ? "a.csv" : "o.csv")));
+        ASSERT_TRUE(
+            writer.open(kind, dir / (kind == orv::LeqFileKind::AllPass ? "a.csv" : "o.csv")));
         ASSERT_TRUE(writer.formatHeader(kind, info, 12));
         ASSERT_TRUE(writer.writeColumnHeader(kind));
     }
@@ -232,8 +236,9 @@ TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
     for (const char* base : {"a", "o"}) {
         std::size_t rowsSeen = 0;
         for (int part = 0; part < 5; ++part) {
-            const std::string name = part == 0 ? dir / (std::string(base) + ".csv")
-                                               : dir / (std::string(base) + "_" + std::to_string(part) + ".csv");
+            const std::string name =
+                part == 0 ? dir / (std::string(base) + ".csv")
+                          : dir / (std::string(base) + "_" + std::to_string(part) + ".csv");
             const std::string text = readFile(name);
             std::istringstream in(text);
             std::string line;
@@ -241,7 +246,8 @@ TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
             while (std::getline(in, line)) {
                 if (++n > 21) {
                     ++rowsSeen;
-                    EXPECT_EQ(line.rfind("\"02/01/2021\",\"'12:00:00.0\",\"42.0\",", 0), 0U) << line;
+                    EXPECT_EQ(line.rfind("\"02/01/2021\",\"'12:00:00.0\",\"42.0\",", 0), 0U)
+                        << line;
                     EXPECT_EQ(std::count(line.begin(), line.end(), '"'), base[0] == 'a' ? 8 : 30);
                 }
             }
@@ -291,7 +297,8 @@ TEST(ResultNames, FlatAndSubDirectoryLayouts) {
     s.statsIntervalMin = 15;
     s.leqInterval = 4;
     EXPECT_EQ(orv::ResultNaming(s, session, 2).general(), d + "GEN_A_15_F.csv");
-    EXPECT_EQ(orv::ResultNaming(s, session, 2).leq(orv::LeqFileKind::AllPass, 0), d + "LEQ_A_4_F.csv");
+    EXPECT_EQ(orv::ResultNaming(s, session, 2).leq(orv::LeqFileKind::AllPass, 0),
+              d + "LEQ_A_4_F.csv");
 }
 
 TEST(ResultFiles, ReplacedNotAppendedAndFailuresReported) {

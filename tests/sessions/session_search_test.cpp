@@ -19,15 +19,13 @@ std::string real(const std::string& path) {
     platform::canonicalDirectory(path, out);
     return out;
 }
-std::string added(const std::string& name) {
-    return "MSG: Added - \"" + name + "\".\r\n";
-}
+std::string added(const std::string& name) { return "MSG: Added - \"" + name + "\".\r\n"; }
 std::string duplicate(const std::string& name) {
     return "MSG: Duplicate Session Found - \"" + name + "\". Using first instance\r\n";
 }
 
 class SearchTest : public ::testing::Test {
-  protected:
+protected:
     testing_support::TempDir tmp;
     std::string root = real(tmp.path());
     orv::SessionTable table;
@@ -54,8 +52,7 @@ class SearchTest : public ::testing::Test {
     }
     Strings paths() const {
         Strings p;
-        for (const auto& e : found.entries)
-            p.push_back(e.sessionPath);
+        for (const auto& e : found.entries) p.push_back(e.sessionPath);
         return p;
     }
     orv::SessionTable found;

@@ -45,8 +45,7 @@ std::string infoFileText(const InfoFields& f) {
     addLine(text, "TRIG SETTING", f.trigSetting);
     addLine(text, "TRIG PRE REC LENGTH", f.trigPreRecLength);
     addLine(text, "TRIG TYPE", f.trigType);
-    for (const std::string& line : f.extraLines)
-        text += line;
+    for (const std::string& line : f.extraLines) text += line;
     return text;
 }
 
@@ -99,8 +98,7 @@ void writeLevelFile(const std::string& path, const LevelFileHeader& header,
 SessionLayout namedSession(const std::string& name) {
     SessionLayout layout;
     layout.info.sessionName = name;
-    for (LevelFileLayout& file : layout.levelFiles)
-        file.header.sessionTitle = name;
+    for (LevelFileLayout& file : layout.levelFiles) file.header.sessionTitle = name;
     return layout;
 }
 
@@ -115,10 +113,8 @@ std::string writeSession(const std::string& dir, const SessionLayout& layout) {
         const std::string name = file.name.empty() ? levelFileName(file.header) : file.name;
         writeLevelFile(dir + "/" + file.dataDir + "/" + name, file.header, file.rows);
     }
-    for (const std::string& wave : layout.waveFiles)
-        writeFile(dir + "/" + wave, "");
-    for (const std::string& extra : layout.extraDirs)
-        makeDirs(dir + "/" + extra);
+    for (const std::string& wave : layout.waveFiles) writeFile(dir + "/" + wave, "");
+    for (const std::string& extra : layout.extraDirs) makeDirs(dir + "/" + extra);
     return dir;
 }
 

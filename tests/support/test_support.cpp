@@ -94,7 +94,8 @@ RunResult runToolProcess(const std::vector<std::string>& args) {
     RunResult r;
     char buffer[4096];
     ssize_t n;
-    while ((n = ::read(fds[0], buffer, sizeof buffer)) > 0) r.output.append(buffer, static_cast<std::size_t>(n));
+    while ((n = ::read(fds[0], buffer, sizeof buffer)) > 0)
+        r.output.append(buffer, static_cast<std::size_t>(n));
     ::close(fds[0]);
     int wstatus = 0;
     ::waitpid(pid, &wstatus, 0);

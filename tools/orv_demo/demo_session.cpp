@@ -148,7 +148,7 @@ void writeText(const std::string& path, const std::string& text) {
 
 // Everything that turns the scene into files, for one session.
 class SessionWriter {
-  public:
+public:
     SessionWriter(const DemoOptions& o, const SessionPlan& plan, const SoundScene& scene)
         : options_(o),
           plan_(plan),
@@ -163,20 +163,18 @@ class SessionWriter {
     void run(DemoSummary& summary) {
         std::int64_t record = 0;
         for (const Recording& r : plan_.recordings) {
-            for (; record < r.firstRecord; ++record)
-                modelRecord(record);
+            for (; record < r.firstRecord; ++record) modelRecord(record);
             model_.continueFrom(renderRecording(r));
             record = r.endRecord;
             summary.audioSeconds += (r.endRecord - r.firstRecord) / 10;
         }
-        for (; record < plan_.recordCount; ++record)
-            modelRecord(record);
+        for (; record < plan_.recordCount; ++record) modelRecord(record);
         levels_.finish();
         summary.levelFiles = levels_.fileNames();
         summary.overloadedRecords = overloaded_;
     }
 
-  private:
+private:
     // Battery: falling steadily from 12.8 V to 12.6 V over the session.
     float battery(std::int64_t record) const {
         return 12.8F - 0.2F * static_cast<float>(record) / static_cast<float>(plan_.recordCount);

@@ -19,7 +19,7 @@ struct PeriodPowers {
 };
 
 class LevelMeter {
-  public:
+public:
     // Weighting filters and time weightings start from silence.
     LevelMeter();
 
@@ -27,7 +27,7 @@ class LevelMeter {
     // filter states for the next call, and appends one entry per period to `out`.
     void process(const float* samples, std::size_t count, std::vector<PeriodPowers>& out);
 
-  private:
+private:
     SlmLibrary::FWeight weighting_;
     SlmLibrary::TWeight timeA_, timeC_;
     std::vector<float> c_, a_;  // squared C- and A-weighted signals

@@ -25,8 +25,7 @@ int main(int argc, char** argv) {
         const double seconds =
             std::chrono::duration<double>(std::chrono::steady_clock::now() - began).count();
         std::size_t waveFiles = 0;
-        for (const orv_demo::Recording& r : s.plan.recordings)
-            waveFiles += r.parts.size();
+        for (const orv_demo::Recording& r : s.plan.recordings) waveFiles += r.parts.size();
         std::printf(
             "Session %s: %lld records of 100 ms in %zu level file(s), %zu wave file(s) "
             "with %lld s of audio, %zu pass-by(s), %lld overloaded record(s); %.2f s\n",

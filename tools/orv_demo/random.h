@@ -16,9 +16,7 @@ constexpr std::uint64_t mix64(std::uint64_t x) {
     return x ^ (x >> 31);
 }
 
-constexpr std::uint64_t mix64(std::uint64_t a, std::uint64_t b) {
-    return mix64(a ^ mix64(b));
-}
+constexpr std::uint64_t mix64(std::uint64_t a, std::uint64_t b) { return mix64(a ^ mix64(b)); }
 
 // Uniform value in [0, 1) from 53 bits of a hash.
 inline double unitFromBits(std::uint64_t bits) {
@@ -27,7 +25,7 @@ inline double unitFromBits(std::uint64_t bits) {
 
 // xorshift64*: fast, good enough for noise signals.
 class Rng {
-  public:
+public:
     explicit Rng(std::uint64_t seed) : state_(mix64(seed) | 1U) {}
 
     std::uint64_t next() {
@@ -48,7 +46,7 @@ class Rng {
         return std::sqrt(-2.0 * std::log(u)) * std::cos(6.283185307179586 * uniform());
     }
 
-  private:
+private:
     std::uint64_t state_;
 };
 

@@ -33,8 +33,7 @@ void appendUnsigned(std::string& out, unsigned v) {
         digits[n++] = static_cast<char>('0' + v % 10);
         v /= 10;
     } while (v != 0);
-    while (n > 0)
-        out += digits[--n];
+    while (n > 0) out += digits[--n];
 }
 
 // Appends v with one decimal as printf's "%.1f" does for the levels of a level file.

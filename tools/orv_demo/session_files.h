@@ -40,7 +40,7 @@ struct LevelRow {
 // Writes consecutive 100 ms records into hourly files dataDir/YYYYMMDD_HH.csv, each with
 // the six header lines; a file holds the records of its hour that were added.
 class HourlyLevelWriter {
-  public:
+public:
     // firstRecordTenths: time stamp of the first record, tenths of a second since 1970.
     HourlyLevelWriter(std::string dataDir, std::string title, std::string serialNumber,
                       std::int64_t firstRecordTenths, std::uint64_t seed);
@@ -51,7 +51,7 @@ class HourlyLevelWriter {
     // Names of the files written, in time order.
     const std::vector<std::string>& fileNames() const { return fileNames_; }
 
-  private:
+private:
     void startHour(std::int64_t hourIndex);
     void writeHour();
 

@@ -21,14 +21,10 @@ constexpr double kBackgroundHiss = 0.65;
 // Hum levels (dB, unweighted) of 100, 200 and 300 Hz.
 constexpr std::array<double, 3> kHumDb = {52.0, 44.0, 38.0};
 
-double dbToPower(double db) {
-    return std::pow(10.0, 0.1 * db);
-}
+double dbToPower(double db) { return std::pow(10.0, 0.1 * db); }
 
 // One-pole coefficient for a corner frequency in Hz.
-float onePole(double hz) {
-    return static_cast<float>(1.0 - std::exp(-kTwoPi * hz / kSampleRate));
-}
+float onePole(double hz) { return static_cast<float>(1.0 - std::exp(-kTwoPi * hz / kSampleRate)); }
 
 double passByEnvelope(const PassBy& p, double t) {
     const double dt = std::abs(t - p.peakTime);
@@ -140,8 +136,7 @@ void NoiseBank::next(float out[kNoiseSourceCount]) {
 Hum::Hum(std::uint64_t seed) {
     Rng rng(mix64(seed, 0x4D));
     std::array<double, kHumDb.size()> phase{};
-    for (double& p : phase)
-        p = kTwoPi * rng.uniform();
+    for (double& p : phase) p = kTwoPi * rng.uniform();
     for (std::size_t i = 0; i < kCycle; ++i) {
         double v = 0.0;
         for (std::size_t h = 0; h < kHumDb.size(); ++h) {
@@ -163,15 +158,13 @@ SourceResponse measureSourceResponse() {
     constexpr std::size_t kMeasure = 40 * kPeriodSamples;
     constexpr std::size_t kTotal = kSettle + kMeasure;
     std::array<std::vector<float>, kNoiseSourceCount + 1> signals;
-    for (auto& s : signals)
-        s.resize(kTotal);
+    for (auto& s : signals) s.resize(kTotal);
     NoiseBank noise(0x0DE40);
     const Hum hum(0x0DE40);
     float v[kNoiseSourceCount];
     for (std::size_t i = 0; i < kTotal; ++i) {
         noise.next(v);
-        for (std::size_t s = 0; s < kNoiseSourceCount; ++s)
-            signals[s][i] = v[s];
+        for (std::size_t s = 0; s < kNoiseSourceCount; ++s) signals[s][i] = v[s];
         signals[kNoiseSourceCount][i] = hum.at(static_cast<std::int64_t>(i));
     }
     SourceResponse r;
@@ -211,8 +204,7 @@ AudioSynth::AudioSynth(const SoundScene& scene, const SourceResponse& response, 
                              : -((-firstSample + kNodeSamples - 1) / kNodeSamples)) {
     // The filters of the noise sources start from rest; 0.1 s lets their slowest pole settle.
     float v[kNoiseSourceCount];
-    for (std::size_t i = 0; i < kPeriodSamples; ++i)
-        noise_.next(v);
+    for (std::size_t i = 0; i < kPeriodSamples; ++i) noise_.next(v);
     gain0_ = gainsAt(node_);
     gain1_ = gainsAt(node_ + 1);
 }

@@ -43,7 +43,7 @@ struct SceneSettings {
 };
 
 class SoundScene {
-  public:
+public:
     explicit SoundScene(const SceneSettings& settings);
 
     const std::vector<PassBy>& passBys() const { return passBys_; }
@@ -54,7 +54,7 @@ class SoundScene {
     // at time t.
     SourcePowers powersAt(double t) const;
 
-  private:
+private:
     double smoothNoise(double u, std::uint64_t stream) const;
 
     SceneSettings settings_;
@@ -75,11 +75,11 @@ SourceResponse measureSourceResponse();
 
 // Unit-gain noise sources: one white noise generator per source, shaped by simple filters.
 class NoiseBank {
-  public:
+public:
     explicit NoiseBank(std::uint64_t seed);
     void next(float out[kNoiseSourceCount]);
 
-  private:
+private:
     struct Pink {  // -3 dB per octave from white noise (three-pole approximation)
         float b0 = 0, b1 = 0, b2 = 0;
         float step(float white);
@@ -98,12 +98,12 @@ class NoiseBank {
 
 // The hum: 100 Hz with its second and third harmonics; one cycle is 480 samples.
 class Hum {
-  public:
+public:
     static constexpr std::size_t kCycle = 480;
     explicit Hum(std::uint64_t seed);
     float at(std::int64_t sampleIndex) const;
 
-  private:
+private:
     std::array<float, kCycle> cycle_{};
 };
 
@@ -111,13 +111,13 @@ class Hum {
 // level in dB. Sample index 0 is the start of the session; rendering may start anywhere,
 // and the noise then depends on the seed and on that start.
 class AudioSynth {
-  public:
+public:
     AudioSynth(const SoundScene& scene, const SourceResponse& response, std::uint64_t seed,
                std::int64_t firstSample);
     // The next `count` samples.
     void render(float* out, std::size_t count);
 
-  private:
+private:
     // Amplitude of each source at gain node j (every 10 ms).
     SourcePowers gainsAt(std::int64_t node) const;
 
@@ -136,7 +136,7 @@ class AudioSynth {
 // powers follow the exponential average of the period powers. The peak sample is
 // estimated as 4.5 times the C-weighted RMS.
 class LevelModel {
-  public:
+public:
     LevelModel(const SoundScene& scene, const SourceResponse& response, std::uint64_t seed);
     // Powers of period `record` (time record / 10 s), continuing the F-weighted averages
     // from the period before, whichever way that was computed.
@@ -144,7 +144,7 @@ class LevelModel {
     // Continues from powers measured on audio.
     void continueFrom(const PeriodPowers& last);
 
-  private:
+private:
     const SoundScene& scene_;
     SourceResponse response_;
     std::uint64_t seed_;

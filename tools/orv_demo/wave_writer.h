@@ -12,7 +12,7 @@ namespace orv_demo {
 inline constexpr std::uint32_t kSampleRate = 48000;
 
 class WaveWriter {
-  public:
+public:
     // Creates the file with a header for an empty recording; throws std::runtime_error when
     // the file cannot be created.
     explicit WaveWriter(const std::string& path);
@@ -27,7 +27,7 @@ class WaveWriter {
     void close();
     std::uint64_t samplesWritten() const { return samples_; }
 
-  private:
+private:
     std::string path_;
     std::ofstream file_;
     std::uint64_t samples_ = 0;

@@ -79,8 +79,7 @@ QuarterKernels makeQuarterKernels() {
             taps[i] = sinc(x) * sinc(x / 4.0);
             sum += taps[i];
         }
-        for (int i = 0; i < 8; ++i)
-            k.h[t][i] = static_cast<float>(taps[i] / sum);
+        for (int i = 0; i < 8; ++i) k.h[t][i] = static_cast<float>(taps[i] / sum);
     }
     return k;
 }
@@ -127,8 +126,7 @@ void BandLevels<W>::reset() {
     primeCount_.fill(0);
     tail_.fill(0.0F);
     tailSettled_ = false;
-    for (std::size_t l = 0; l < W; ++l)
-        primed_[l] = !active_[l] || code_ == TWeight::N;
+    for (std::size_t l = 0; l < W; ++l) primed_[l] = !active_[l] || code_ == TWeight::N;
     allPrimed_ = code_ != TWeight::N &&
                  std::all_of(primed_.begin(), primed_.end(), [](bool p) { return p; });
     periodSum_.fill(0.0);
@@ -150,10 +148,8 @@ void BandLevels<W>::resetStatistics() {
     max_.fill(-std::numeric_limits<double>::infinity());
     min_.fill(std::numeric_limits<double>::infinity());
     hasExtremes_.fill(false);
-    for (LevelHistogram& h : histogram_)
-        h.reset();
-    for (std::vector<Leq>& s : shortLeqs_)
-        s.clear();
+    for (LevelHistogram& h : histogram_) h.reset();
+    for (std::vector<Leq>& s : shortLeqs_) s.clear();
     if (code_ == TWeight::N) {
         // A new statistics interval starts a new 100 ms period.
         periodPhase_ = 0;
@@ -227,8 +223,7 @@ void BandLevels<W>::processFast(const float* frames, std::size_t count) {
                 }
             }
         }
-        for (std::size_t l = 0; l < W; ++l)
-            hasExtremes_[l] = hasExtremes_[l] || active_[l];
+        for (std::size_t l = 0; l < W; ++l) hasExtremes_[l] = hasExtremes_[l] || active_[l];
         seen_ += run;
         count_ += run;
         i += run;
@@ -267,8 +262,7 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
         for (std::size_t base = j - 1; base <= j; ++base) {
             for (int t = 0; t < 3; ++t) {
                 float s = 0.0F;
-                for (std::size_t i = 0; i < 8; ++i)
-                    s += k.h[t][i] * x[(base - 3 + i) * W + l];
+                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x[(base - 3 + i) * W + l];
                 best[l] = std::max(best[l], std::fabs(s));
             }
         }

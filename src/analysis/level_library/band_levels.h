@@ -39,7 +39,7 @@ namespace SlmLibrary {
 
 template <std::size_t W>
 class BandLevels {
-  public:
+public:
     struct LaneSetup {
         bool active = false;
         double settleSeconds = 0.0;
@@ -76,7 +76,7 @@ class BandLevels {
     double seconds() const { return static_cast<double>(count_) / rate_; }
     const std::vector<Leq>& shortLeqs(std::size_t lane) const { return shortLeqs_[lane]; }
 
-  private:
+private:
     void processFast(const float* frames, std::size_t count);
     void processSlow(const float* frames, std::size_t count, bool entering);
     void finishPriming(std::size_t lane);

@@ -34,8 +34,7 @@ bool isReal(const Complex& c) {
 // prod(-x) over a root list, for the gain bookkeeping of the transforms.
 Complex productOfNegated(const std::vector<Complex>& roots) {
     Complex p = 1.0;
-    for (const Complex& r : roots)
-        p *= -r;
+    for (const Complex& r : roots) p *= -r;
     return p;
 }
 
@@ -57,15 +56,9 @@ struct Quadratic {  // 1 + c1 x^-1 + c2 x^-2, from its roots
     double c2 = 0.0;
 };
 
-Quadratic fromPair(const Complex& r) {
-    return {-2.0 * r.real(), std::norm(r)};
-}
-Quadratic fromReals(double r1, double r2) {
-    return {-(r1 + r2), r1 * r2};
-}
-Quadratic fromReal(double r) {
-    return {-r, 0.0};
-}
+Quadratic fromPair(const Complex& r) { return {-2.0 * r.real(), std::norm(r)}; }
+Quadratic fromReals(double r1, double r2) { return {-(r1 + r2), r1 * r2}; }
+Quadratic fromReal(double r) { return {-r, 0.0}; }
 
 }  // namespace
 
@@ -98,10 +91,8 @@ Zpk chebyshev2Prototype(int order, double stopbandDb) {
 
 Zpk lowpassToLowpass(const Zpk& proto, double w) {
     Zpk out;
-    for (const Complex& z : proto.zeros)
-        out.zeros.push_back(z * w);
-    for (const Complex& p : proto.poles)
-        out.poles.push_back(p * w);
+    for (const Complex& z : proto.zeros) out.zeros.push_back(z * w);
+    for (const Complex& p : proto.poles) out.poles.push_back(p * w);
     const int degree = static_cast<int>(proto.poles.size() - proto.zeros.size());
     out.gain = proto.gain * std::pow(w, degree);
     return out;
@@ -109,10 +100,8 @@ Zpk lowpassToLowpass(const Zpk& proto, double w) {
 
 Zpk lowpassToHighpass(const Zpk& proto, double w) {
     Zpk out;
-    for (const Complex& z : proto.zeros)
-        out.zeros.push_back(w / z);
-    for (const Complex& p : proto.poles)
-        out.poles.push_back(w / p);
+    for (const Complex& z : proto.zeros) out.zeros.push_back(w / z);
+    for (const Complex& p : proto.poles) out.poles.push_back(w / p);
     out.zeros.resize(out.poles.size(), Complex(0.0, 0.0));
     out.gain = proto.gain * (productOfNegated(proto.zeros) / productOfNegated(proto.poles)).real();
     return out;
@@ -126,13 +115,10 @@ Zpk lowpassToBandpass(const Zpk& proto, double w0, double bw) {
         into.push_back(half + root);
         into.push_back(half - root);
     };
-    for (const Complex& z : proto.zeros)
-        transform(z, out.zeros);
-    for (const Complex& p : proto.poles)
-        transform(p, out.poles);
+    for (const Complex& z : proto.zeros) transform(z, out.zeros);
+    for (const Complex& p : proto.poles) transform(p, out.poles);
     const std::size_t degree = proto.poles.size() - proto.zeros.size();
-    for (std::size_t i = 0; i < degree; ++i)
-        out.zeros.emplace_back(0.0, 0.0);
+    for (std::size_t i = 0; i < degree; ++i) out.zeros.emplace_back(0.0, 0.0);
     out.gain = proto.gain * std::pow(bw, static_cast<double>(degree));
     return out;
 }
@@ -145,10 +131,8 @@ Zpk lowpassToBandstop(const Zpk& proto, double w0, double bw) {
         into.push_back(half + root);
         into.push_back(half - root);
     };
-    for (const Complex& z : proto.zeros)
-        transform(z, out.zeros);
-    for (const Complex& p : proto.poles)
-        transform(p, out.poles);
+    for (const Complex& z : proto.zeros) transform(z, out.zeros);
+    for (const Complex& p : proto.poles) transform(p, out.poles);
     const std::size_t degree = proto.poles.size() - proto.zeros.size();
     for (std::size_t i = 0; i < degree; ++i) {
         out.zeros.emplace_back(0.0, w0);
@@ -158,9 +142,7 @@ Zpk lowpassToBandstop(const Zpk& proto, double w0, double bw) {
     return out;
 }
 
-double prewarp(double f, double fs) {
-    return 2.0 * fs * std::tan(kPi * f / fs);
-}
+double prewarp(double f, double fs) { return 2.0 * fs * std::tan(kPi * f / fs); }
 
 Zpk bilinear(const Zpk& analog, double fs) {
     const double k = 2.0 * fs;
@@ -214,8 +196,7 @@ SosList toSos(const Zpk& digital, double fRef, double fs, double gainAtRef) {
     std::sort(zeroReals.begin(), zeroReals.end());
     std::size_t lo = 0;
     std::size_t hi = zeroReals.size();
-    while (hi - lo >= 2)
-        nums.push_back(fromReals(zeroReals[lo++], zeroReals[--hi]));
+    while (hi - lo >= 2) nums.push_back(fromReals(zeroReals[lo++], zeroReals[--hi]));
     if (hi - lo == 1) nums.push_back(fromReal(zeroReals[lo]));
 
     const std::size_t count = std::max(dens.size(), zeroPairs.size() + nums.size());
@@ -259,8 +240,7 @@ SosList toSos(const Zpk& digital, double fRef, double fs, double gainAtRef) {
 
 Complex response(const SosList& sos, double f, double fs) {
     Complex h = 1.0;
-    for (const Sos& s : sos)
-        h *= s.response(f, fs);
+    for (const Sos& s : sos) h *= s.response(f, fs);
     return h;
 }
 
@@ -271,17 +251,14 @@ double magnitudeDb(const SosList& sos, double f, double fs) {
 Complex analogResponse(const Zpk& analog, double w) {
     const Complex s(0.0, w);
     Complex h = analog.gain;
-    for (const Complex& z : analog.zeros)
-        h *= s - z;
-    for (const Complex& p : analog.poles)
-        h /= s - p;
+    for (const Complex& z : analog.zeros) h *= s - z;
+    for (const Complex& p : analog.poles) h /= s - p;
     return h;
 }
 
 double settleSeconds(const SosList& sos, double fs, double decayDb) {
     double radius = 0.0;
-    for (const Sos& s : sos)
-        radius = std::max(radius, s.poleRadius());
+    for (const Sos& s : sos) radius = std::max(radius, s.poleRadius());
     if (radius <= 0.0) return 0.0;
     const double nepers = decayDb / 20.0 * std::log(10.0);
     return nepers / -std::log(radius) / fs;

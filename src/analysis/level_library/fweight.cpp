@@ -52,8 +52,7 @@ std::array<double, 3> solve3(std::array<std::array<double, 4>, 3> m) {
         for (int r = 0; r < 3; ++r) {
             if (r == col) continue;
             const double k = m[r][col] / m[col][col];
-            for (int c = col; c < 4; ++c)
-                m[r][c] -= k * m[col][c];
+            for (int c = col; c < 4; ++c) m[r][c] -= k * m[col][c];
         }
     }
     return {m[0][3] / m[0][0], m[1][3] / m[1][1], m[2][3] / m[2][2]};
@@ -147,9 +146,7 @@ SosList cascadeFor(unsigned code, double fs) {
 
 }  // namespace
 
-FWeight::FWeight(double sampleRate) : fs_(sampleRate) {
-    init(Z, sampleRate);
-}
+FWeight::FWeight(double sampleRate) : fs_(sampleRate) { init(Z, sampleRate); }
 
 void FWeight::init(unsigned code, double sampleRate) {
     if (code != Z && code != A && code != C && code != All) {
@@ -176,8 +173,7 @@ void FWeight::reset() {
 void FWeight::Process(const float* in, float* out, std::size_t n) {
     if (code_ == Z) {
         if (out != in) {
-            for (std::size_t i = 0; i < n; ++i)
-                out[i] = in[i];
+            for (std::size_t i = 0; i < n; ++i) out[i] = in[i];
         }
         return;
     }

@@ -22,7 +22,7 @@
 namespace SlmLibrary {
 
 class FWeight {
-  public:
+public:
     // Codes stored in settings and passed between modules. 5 selects the three outputs of
     // ProcessAll (Z, C and A of one input).
     enum FWeightEnum : unsigned { Z = 0, A = 1, C = 2, All = 5 };
@@ -56,7 +56,7 @@ class FWeight {
     static const char* shortName(unsigned code);
     static const char* longName(unsigned code);
 
-  private:
+private:
     unsigned code_ = Z;
     double fs_;
     SosCascade shared_;  // 20.6 Hz double pole with two zeros at 0 Hz: common to A and C

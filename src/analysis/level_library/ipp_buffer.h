@@ -8,7 +8,7 @@ namespace SlmLibrary {
 
 template <typename T>
 class IppBuffer {
-  public:
+public:
     explicit IppBuffer(std::size_t size, T fill = T{}) : values_(size, fill) {}
 
     T* data() { return values_.data(); }
@@ -21,7 +21,7 @@ class IppBuffer {
     const T* begin() const { return values_.data(); }
     const T* end() const { return values_.data() + values_.size(); }
 
-  private:
+private:
     std::vector<T> values_;
 };
 

@@ -66,8 +66,8 @@ void LevelHistogram::exceedanceLevels(const float* percents, std::size_t n, floa
         above += counts_[c];
         // Class c is reached or exceeded by `above` entries: it answers every percentile
         // whose share of the entries is at most that.
-        while (next < n &&
-               static_cast<double>(percents[order[next]]) * total <= static_cast<double>(above) * 100.0) {
+        while (next < n && static_cast<double>(percents[order[next]]) * total <=
+                               static_cast<double>(above) * 100.0) {
             out[order[next++]] = levelOfClass(c);
         }
     }

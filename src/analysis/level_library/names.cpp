@@ -17,14 +17,14 @@ constexpr std::array<const char*, 4> kTWeightShort = {"N", "I", "F", "S"};
 constexpr std::array<const char*, 4> kTWeightLong = {"None", "Impulse", "Fast", "Slow"};
 
 constexpr std::array<const char*, kFullOctaveBandCount> kFullNames = {
-    "8Hz",   "16Hz",  "31.5Hz", "63Hz", "125Hz", "250Hz",
-    "500Hz", "1kHz",  "2kHz",   "4kHz", "8kHz",  "16kHz"};
+    "8Hz",   "16Hz", "31.5Hz", "63Hz", "125Hz", "250Hz",
+    "500Hz", "1kHz", "2kHz",   "4kHz", "8kHz",  "16kHz"};
 
 constexpr std::array<const char*, kThirdOctaveBandCount> kThirdNames = {
-    "6.3Hz",  "8Hz",    "10Hz",    "12.5Hz", "16Hz",   "20Hz",    "25Hz",   "31.5Hz", "40Hz",
-    "50Hz",   "63Hz",   "80Hz",    "100Hz",  "125Hz",  "160Hz",   "200Hz",  "250Hz",  "315Hz",
-    "400Hz",  "500Hz",  "630Hz",   "800Hz",  "1kHz",   "1.25kHz", "1.6kHz", "2kHz",   "2.5kHz",
-    "3.15kHz", "4kHz",  "5kHz",    "6.3kHz", "8kHz",   "10kHz",   "12.5kHz", "16kHz", "20kHz"};
+    "6.3Hz",   "8Hz",   "10Hz",  "12.5Hz", "16Hz",  "20Hz",    "25Hz",    "31.5Hz", "40Hz",
+    "50Hz",    "63Hz",  "80Hz",  "100Hz",  "125Hz", "160Hz",   "200Hz",   "250Hz",  "315Hz",
+    "400Hz",   "500Hz", "630Hz", "800Hz",  "1kHz",  "1.25kHz", "1.6kHz",  "2kHz",   "2.5kHz",
+    "3.15kHz", "4kHz",  "5kHz",  "6.3kHz", "8kHz",  "10kHz",   "12.5kHz", "16kHz",  "20kHz"};
 
 template <std::size_t N>
 const char* lookup(const std::array<const char*, N>& table, unsigned code) {

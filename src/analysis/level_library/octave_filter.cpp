@@ -174,16 +174,14 @@ OctaveFilter::Limits OctaveFilter::class1Limits(Bank bank, double omega) {
 std::vector<double> OctaveFilter::maskBreakpoints(Bank bank) {
     const unsigned b = bandsPerOctave(bank);
     std::vector<double> out;
-    for (const Breakpoint& p : kPassBand)
-        out.push_back(omegaOf(b, p.x));
+    for (const Breakpoint& p : kPassBand) out.push_back(omegaOf(b, p.x));
     for (std::size_t i = 1; i < std::size(kStopBand); ++i)
         out.push_back(omegaOf(b, kStopBand[i].x));
     return out;
 }
 
 OctaveFilter::OctaveFilter(Bank bank) : bank_(bank), design_(&design(bank)) {
-    for (unsigned s = 0; s + 1 < kStages; ++s)
-        antiAlias_.emplace_back(design_->antiAlias);
+    for (unsigned s = 0; s + 1 < kStages; ++s) antiAlias_.emplace_back(design_->antiAlias);
     for (const Group& g : design_->groups) {
         std::vector<SosList> lanes(kLaneWidth);
         for (std::size_t l = 0; l < kLaneWidth; ++l) {
@@ -205,15 +203,9 @@ OctaveFilter::~OctaveFilter() = default;
 OctaveFilter::OctaveFilter(OctaveFilter&&) noexcept = default;
 OctaveFilter& OctaveFilter::operator=(OctaveFilter&&) noexcept = default;
 
-const std::vector<OctaveFilter::Group>& OctaveFilter::groups() const {
-    return design_->groups;
-}
-std::size_t OctaveFilter::groupOf(unsigned band) const {
-    return design_->groupOf.at(band);
-}
-std::size_t OctaveFilter::laneOf(unsigned band) const {
-    return design_->laneOf.at(band);
-}
+const std::vector<OctaveFilter::Group>& OctaveFilter::groups() const { return design_->groups; }
+std::size_t OctaveFilter::groupOf(unsigned band) const { return design_->groupOf.at(band); }
+std::size_t OctaveFilter::laneOf(unsigned band) const { return design_->laneOf.at(band); }
 
 double OctaveFilter::settleSeconds(unsigned band, double decayDb) const {
     const unsigned stage = design_->bandStage.at(band);
@@ -235,12 +227,9 @@ double OctaveFilter::designResponseDb(unsigned band, double f) const {
 }
 
 void OctaveFilter::reset() {
-    for (SosCascade& a : antiAlias_)
-        a.reset();
-    for (SosLanes<float>& l : lanesF_)
-        l.reset();
-    for (SosLanes<double>& l : lanesD_)
-        l.reset();
+    for (SosCascade& a : antiAlias_) a.reset();
+    for (SosLanes<float>& l : lanesF_) l.reset();
+    for (SosLanes<double>& l : lanesD_) l.reset();
 }
 
 void OctaveFilter::process(const float* in, std::size_t n, Sink& sink) {
@@ -273,7 +262,7 @@ namespace {
 
 // Mean square of each band over a window, after a settling time.
 class ToneSink : public OctaveFilter::Sink {
-  public:
+public:
     ToneSink(const OctaveFilter& bank, std::size_t inputStart)
         : bank_(bank),
           start_(inputStart),
@@ -299,7 +288,7 @@ class ToneSink : public OctaveFilter::Sink {
         return sums_[band] / static_cast<double>(counts_[band]);
     }
 
-  private:
+private:
     const OctaveFilter& bank_;
     std::size_t start_;
     std::vector<double> sums_;
@@ -329,8 +318,7 @@ std::vector<double> OctaveFilter::toneResponseDb(Bank bank, double f, double set
     ToneSink sink(filter, settle);
     filter.process(x.data(), x.size(), sink);
     std::vector<double> out(bandCount(bank));
-    for (unsigned b = 0; b < out.size(); ++b)
-        out[b] = 10.0 * std::log10(sink.meanSquare(b) / 0.5);
+    for (unsigned b = 0; b < out.size(); ++b) out[b] = 10.0 * std::log10(sink.meanSquare(b) / 0.5);
     return out;
 }
 

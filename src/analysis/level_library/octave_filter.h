@@ -33,7 +33,7 @@ enum FullOctaveBandEnum : unsigned { kFullOctaveBandCount = 12 };
 enum ThirdOctaveBandEnum : unsigned { kThirdOctaveBandCount = 36 };
 
 class OctaveFilter {
-  public:
+public:
     enum class Bank { Full, Third };
     static constexpr double kSampleRate = 48000.0;
     static constexpr unsigned kStages = 6;  // 48000, 24000, ..., 1500 Hz
@@ -69,7 +69,7 @@ class OctaveFilter {
     };
     // Receives the band outputs of a group: count frames of kLaneWidth floats.
     class Sink {
-      public:
+    public:
         virtual ~Sink() = default;
         virtual void onBands(std::size_t group, const float* frames, std::size_t count) = 0;
     };
@@ -101,7 +101,7 @@ class OctaveFilter {
     static std::vector<double> toneResponseDb(Bank bank, double f, double settleSeconds,
                                               double measureSeconds);
 
-  private:
+private:
     struct Design;
     static const Design& design(Bank bank);
 

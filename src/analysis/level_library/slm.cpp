@@ -23,16 +23,12 @@ constexpr std::size_t kDecimationGrid = std::size_t{1} << (OctaveFilter::kStages
 // normal time on x86; flush them to zero while this meter processes, and restore the
 // caller's mode afterwards.
 class FlushDenormals {
-  public:
+public:
 #if defined(__SSE__)
-    FlushDenormals() : saved_(_mm_getcsr()) {
-        _mm_setcsr(saved_ | 0x8040U);
-    }
-    ~FlushDenormals() {
-        _mm_setcsr(saved_);
-    }
+    FlushDenormals() : saved_(_mm_getcsr()) { _mm_setcsr(saved_ | 0x8040U); }
+    ~FlushDenormals() { _mm_setcsr(saved_); }
 
-  private:
+private:
     unsigned saved_;
 #endif
 };
@@ -61,9 +57,7 @@ double primeSeconds(unsigned tw, double lowestFrequency) {
     return std::max(TWeight::timeConstant(tw), 2.0 / lowestFrequency);
 }
 
-std::string hz(double f) {
-    return std::to_string(static_cast<long long>(std::lround(f))) + " Hz";
-}
+std::string hz(double f) { return std::to_string(static_cast<long long>(std::lround(f))) + " Hz"; }
 
 // Butterworth filter of the filtered channel, 4th order per edge.
 SosList auxDesign(unsigned type, const float corners[2], double fs) {
@@ -238,24 +232,19 @@ void Slm::initAuxCh(unsigned filterType, const float corners[2], unsigned tw, un
     resetAll();
 }
 
-void Slm::setPercentiles(const std::vector<float>& percents) {
-    percents_ = percents;
-}
+void Slm::setPercentiles(const std::vector<float>& percents) { percents_ = percents; }
 
 void Slm::setPercentiles(const std::vector<std::uint32_t>& percents) {
     percents_.assign(percents.begin(), percents.end());
 }
 
-void Slm::setPercentiles(std::initializer_list<float> percents) {
-    percents_.assign(percents);
-}
+void Slm::setPercentiles(std::initializer_list<float> percents) { percents_.assign(percents); }
 
 void Slm::resetAll() {
     if (bank_) {
         bank_->filter.reset();
         bank_->weight.reset();
-        for (BandLevels<kLaneWidth>& l : bank_->levels)
-            l.reset();
+        for (BandLevels<kLaneWidth>& l : bank_->levels) l.reset();
     }
     if (aux_) {
         aux_->weight.reset();
@@ -268,8 +257,7 @@ void Slm::resetAll() {
 
 void Slm::resetStatistics() {
     if (bank_) {
-        for (BandLevels<kLaneWidth>& l : bank_->levels)
-            l.resetStatistics();
+        for (BandLevels<kLaneWidth>& l : bank_->levels) l.resetStatistics();
     }
     if (aux_) aux_->levels.resetStatistics();
 }
@@ -282,8 +270,7 @@ void Slm::preCondition(const std::int16_t* in, float* out, const std::uint32_t* 
         const bool marked = marks != nullptr && marks[start / kPeriod] != 0;
         const float gain = marked ? calibrationGain * range : calibrationGain;
         const std::size_t end = std::min(count, start + kPeriod);
-        for (std::size_t i = start; i < end; ++i)
-            out[i] = static_cast<float>(in[i]) * gain;
+        for (std::size_t i = start; i < end; ++i) out[i] = static_cast<float>(in[i]) * gain;
     }
 }
 
@@ -295,9 +282,7 @@ void Slm::preRoll(const float* data, std::size_t n) {
     preRollSamples_ += n - skip;
 }
 
-double Slm::preRollSeconds() const {
-    return static_cast<double>(preRollSamples_) / fs_;
-}
+double Slm::preRollSeconds() const { return static_cast<double>(preRollSamples_) / fs_; }
 
 void Slm::addSamples(const float* data, std::size_t n, std::size_t /*unused*/,
                      std::size_t leqSamples) {
@@ -305,16 +290,14 @@ void Slm::addSamples(const float* data, std::size_t n, std::size_t /*unused*/,
     started_ = true;
     if (leqSamples != 0) {
         if (bank_) {
-            for (BandLevels<kLaneWidth>& l : bank_->levels)
-                l.beginCall();
+            for (BandLevels<kLaneWidth>& l : bank_->levels) l.beginCall();
         }
         if (aux_) aux_->levels.beginCall();
     }
     processChunk(data, n, true);
     if (leqSamples != 0) {
         if (bank_) {
-            for (BandLevels<kLaneWidth>& l : bank_->levels)
-                l.endCall();
+            for (BandLevels<kLaneWidth>& l : bank_->levels) l.endCall();
         }
         if (aux_) aux_->levels.endCall();
     }
@@ -391,8 +374,6 @@ const std::vector<Leq>& Slm::getAuxShortLeq() const {
     return aux_ ? aux_->levels.shortLeqs(0) : kNone;
 }
 
-double Slm::auxSettlingSeconds() const {
-    return aux_ ? aux_->settle : 0.0;
-}
+double Slm::auxSettlingSeconds() const { return aux_ ? aux_->settle : 0.0; }
 
 }  // namespace SlmLibrary

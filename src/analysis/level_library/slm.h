@@ -89,7 +89,7 @@ enum SigFilterType : unsigned {
 };
 
 class Slm {
-  public:
+public:
     // sampleRate must be 48000; channels must be 1; maxBlock is the largest n for which
     // addSamples and preRoll work without splitting (larger calls are split internally).
     explicit Slm(double sampleRate = 48000.0, unsigned channels = 1, std::size_t maxBlock = 48000);
@@ -162,7 +162,7 @@ class Slm {
     const std::vector<Leq>& getAuxShortLeq() const;
     double auxSettlingSeconds() const;
 
-  private:
+private:
     struct Bank;
     struct Aux;
 

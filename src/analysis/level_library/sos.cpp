@@ -150,8 +150,7 @@ std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* o
 
 template <typename T>
 SosLanes<T>::SosLanes(const std::vector<SosList>& sos) {
-    for (const SosList& s : sos)
-        sections_ = std::max(sections_, s.size());
+    for (const SosList& s : sos) sections_ = std::max(sections_, s.size());
     if (sections_ > kMaxSections) throw std::invalid_argument("too many sections for a lane");
     coef_.assign(sections_ * 5 * kLaneWidth, T{});
     for (std::size_t k = 0; k < sections_; ++k) {
@@ -300,8 +299,7 @@ template <typename T>
 void SosLanes<T>::process(const float* in, std::size_t n, float* out) {
     if (sections_ == 0) {
         for (std::size_t i = 0; i < n; ++i) {
-            for (std::size_t l = 0; l < kLaneWidth; ++l)
-                out[i * kLaneWidth + l] = in[i];
+            for (std::size_t l = 0; l < kLaneWidth; ++l) out[i * kLaneWidth + l] = in[i];
         }
         return;
     }

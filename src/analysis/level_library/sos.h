@@ -15,7 +15,7 @@ namespace SlmLibrary {
 // One signal through a cascade, double precision state (used where poles sit close to
 // z = 1 at the full rate: frequency weighting, filtered channel, anti-alias filters).
 class SosCascade {
-  public:
+public:
     SosCascade() = default;
     explicit SosCascade(const SosList& sos);
 
@@ -30,7 +30,7 @@ class SosCascade {
 
     std::size_t sections() const { return coeffs_.size(); }
 
-  private:
+private:
     std::vector<Sos> coeffs_;
     std::vector<std::array<double, 2>> state_;  // s1, s2 per section
     bool odd_ = false;                          // decimation phase
@@ -43,7 +43,7 @@ inline constexpr std::size_t kLaneWidth = 8;
 
 template <typename T>
 class SosLanes {
-  public:
+public:
     static constexpr std::size_t kMaxSections = 4;
 
     SosLanes() = default;
@@ -56,7 +56,7 @@ class SosLanes {
     void process(const float* in, std::size_t n, float* out);
     std::size_t sections() const { return sections_; }
 
-  private:
+private:
     std::size_t sections_ = 0;
     std::vector<T> coef_;  // [section][b0 b1 b2 a1 a2][lane]
     std::vector<T> s1_;    // [section][lane]

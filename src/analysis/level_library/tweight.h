@@ -18,7 +18,7 @@
 namespace SlmLibrary {
 
 class TWeight {
-  public:
+public:
     // N: no exponential averaging; I: impulse (never selected by the tool); F: 125 ms; S: 1 s.
     enum TWeightEnum : unsigned { N = 0, I = 1, F = 2, S = 3 };
 
@@ -51,7 +51,7 @@ class TWeight {
     static const char* shortName(unsigned code);
     static const char* longName(unsigned code);
 
-  private:
+private:
     unsigned code_;
     double alpha_ = 0.0;             // F, S
     std::size_t periodSamples_ = 0;  // N
