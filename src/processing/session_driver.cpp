@@ -46,6 +46,9 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
         settings_.leqInterval = ProcessingSettings::kLeqOff;
     }
     const bool leqOn = settings_.leqOn();
+    // The files of the audio results (octave band files, octave Leq file, filtered channel
+    // file) are created here, next to the general and Leq files, once the audio analysis
+    // exists; until then -oct, the filter options and -csv produce no files.
 
     RecordStatistics statistics(settings_, session.triggerOn != 0, general, leqOn ? &leq : nullptr);
     bool headersWritten = false;
@@ -78,6 +81,8 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
             statistics.sequenceCheck(r, header);
             if (leqOn) statistics.stepShortLeq(r, header);
             if (!statistics.stepGeneralStatistics(r, header)) break;  // rest of the file skipped
+            // Audio branch: the record's 100 ms of audio is gated into the current block, which
+            // is dispatched to the analysis workers when the statistics ask for it.
             statistics.takeDispatchRequest();
         }
 
@@ -91,6 +96,7 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     }
 
     out_.print("\r\n");
+    // The audio analysis waits here for the session's workers and writes what they left.
     statistics.finishSession();
     general.close();
     leq.close(LeqFileKind::AllPass);
