@@ -37,8 +37,7 @@ int run(RunState& state, int argc, const char* const* argv, int vectorStartupSta
         SessionProcessor processor(state.settings, out);
         for (std::uint32_t i = 0; i < found; ++i) {
             if (i < state.sessions.count()) {
-                SessionRecord copy = state.sessions.entries[i];
-                processor.processSession(copy, pipe);
+                processor.processSession(state.sessions.entries[i], pipe);
             }
             processed = i + 1;
         }

@@ -112,9 +112,4 @@ bool readTextFile(const std::string& path, std::string& out, int* error) {
 
 bool deleteFile(const std::string& path) { return ::unlink(path.c_str()) == 0; }
 
-bool fileExists(const std::string& path) {
-    struct stat st {};
-    return ::stat(path.c_str(), &st) == 0;
-}
-
 }  // namespace platform

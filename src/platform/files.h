@@ -50,6 +50,5 @@ File createResultFile(const std::string& path, int* error = nullptr);
 // Reads a text file as a text-mode reader does: every CR LF becomes LF, a lone CR stays.
 bool readTextFile(const std::string& path, std::string& out, int* error = nullptr);
 bool deleteFile(const std::string& path);
-bool fileExists(const std::string& path);
 
 }  // namespace platform

@@ -4,6 +4,5 @@
 namespace platform {
 
 inline constexpr char kPathSeparator = '/';
-inline constexpr const char* kPathSeparatorText = "/";
 
 }  // namespace platform

@@ -43,7 +43,6 @@ public:
 
     // Set at a statistics boundary when the audio gathered so far is to be dispatched.
     bool takeDispatchRequest();
-    bool gapPending() const { return gapFlag_ != 0; }
 
 private:
     float selectedSpl(const LevelRecord& r) const { return useC_ ? r.splC : r.splA; }

@@ -24,8 +24,8 @@ public:
 
     void processSession(const SessionRecord& session, ProgressPipe& pipe);
 
-    // The frequency-weighting-independent time weighting the session's general results are
-    // labelled with: F for a 125 ms logger setting, S otherwise.
+    // The time weighting the session's general results are labelled with: F for a 125 ms
+    // logger setting, S otherwise.
     static std::uint32_t generalTimeWeighting(const SessionRecord& session);
 
 private:

@@ -23,11 +23,6 @@ void LeqResultsWriter::close(LeqFileKind kind) {
     file(kind).handle.close();
 }
 
-bool LeqResultsWriter::isOpen(LeqFileKind kind) const {
-    std::lock_guard<std::mutex> lock(mutex_);
-    return file(kind).handle.valid();
-}
-
 bool LeqResultsWriter::formatHeader(LeqFileKind kind, const ResultHeaderInfo& info,
                                     std::uint32_t bandCount) {
     std::lock_guard<std::mutex> lock(mutex_);

@@ -36,7 +36,6 @@ public:
     // Creates part 0 of a file. False (message printed) when it cannot be created.
     bool open(LeqFileKind kind, const std::string& path);
     void close(LeqFileKind kind);
-    bool isOpen(LeqFileKind kind) const;
 
     // Formats and keeps the header block of a file (repeated at the head of every part).
     // False when the file is not open.
