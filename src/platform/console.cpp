@@ -20,6 +20,7 @@ void Console::print(const char* format, ...) {
 }
 
 void Console::write(const char* text, std::size_t length) {
+    const std::lock_guard<std::mutex> lock(mutex_);
     if (capture_ != nullptr) {
         capture_->append(text, length);
         return;

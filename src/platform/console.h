@@ -1,7 +1,9 @@
 // The one console print routine: printf-style text to standard output, unbuffered, with no
-// line ends of its own (every message carries its "\r\n").
+// line ends of its own (every message carries its "\r\n"). Worker threads print too: each
+// message goes out whole, never interleaved with another.
 #pragma once
 
+#include <mutex>
 #include <string>
 
 namespace platform {
@@ -18,6 +20,7 @@ public:
 
 private:
     std::string* capture_ = nullptr;
+    std::mutex mutex_;
 };
 
 // Makes the C stdout stream unbuffered, for any library text that bypasses Console.

@@ -58,6 +58,22 @@ std::size_t File::read(void* data, std::size_t size, int* error) {
     return done;
 }
 
+std::size_t File::readAt(std::uint64_t offset, void* data, std::size_t size, int* error) const {
+    char* p = static_cast<char*>(data);
+    std::size_t done = 0;
+    while (done < size) {
+        const ssize_t r = ::pread(fd_, p + done, size - done, static_cast<off_t>(offset + done));
+        if (r < 0) {
+            if (errno == EINTR) continue;
+            if (error != nullptr) *error = errno;
+            break;
+        }
+        if (r == 0) break;
+        done += static_cast<std::size_t>(r);
+    }
+    return done;
+}
+
 bool File::seekRelative(std::int64_t offset) {
     return ::lseek(fd_, static_cast<off_t>(offset), SEEK_CUR) != static_cast<off_t>(-1);
 }

@@ -31,6 +31,10 @@ public:
     }
     // Reads up to size bytes, looping until done or end of file.
     std::size_t read(void* data, std::size_t size, int* error = nullptr);
+    // Reads up to size bytes at `offset` without moving the file position; safe to call from
+    // several threads on one file at once.
+    std::size_t readAt(std::uint64_t offset, void* data, std::size_t size,
+                       int* error = nullptr) const;
     bool seekRelative(std::int64_t offset);
     std::uint64_t size() const;
 
