@@ -24,11 +24,12 @@ void LeqResultsWriter::close(LeqFileKind kind) {
 }
 
 bool LeqResultsWriter::formatHeader(LeqFileKind kind, const ResultHeaderInfo& info,
-                                    std::uint32_t bandCount) {
+                                    std::uint32_t bandCount, const std::string& extraColumn) {
     std::lock_guard<std::mutex> lock(mutex_);
     LeqFile& f = file(kind);
     if (!f.handle.valid()) return false;
     f.bandCount = bandCount;
+    f.extraColumn = extraColumn;
     const std::uint32_t leqSeconds = displayInterval(info.leqInterval);
     if (kind == LeqFileKind::AllPass) {
         TextBuffer averaging;
@@ -62,6 +63,7 @@ bool LeqResultsWriter::writeColumnHeaderLocked(LeqFileKind kind) {
             b.append("\"%s\",", f.bandCount == 36 ? SlmLibrary::OctaveFilter::getThirdName(band)
                                                   : SlmLibrary::OctaveFilter::getFullName(band));
         }
+        if (!f.extraColumn.empty()) b.append("\"%s\",", f.extraColumn.c_str());
         b.append("\"Overload\"\r\n");
         columns = b.str();
     }

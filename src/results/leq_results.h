@@ -38,8 +38,10 @@ public:
     void close(LeqFileKind kind);
 
     // Formats and keeps the header block of a file (repeated at the head of every part).
-    // False when the file is not open.
-    bool formatHeader(LeqFileKind kind, const ResultHeaderInfo& info, std::uint32_t bandCount);
+    // The octave file's column line names `bandCount` bands, then `extraColumn` when it is
+    // not empty (the filtered channel's level). False when the file is not open.
+    bool formatHeader(LeqFileKind kind, const ResultHeaderInfo& info, std::uint32_t bandCount,
+                      const std::string& extraColumn = {});
     // Writes the kept header and the column line; the line counter becomes 21.
     bool writeColumnHeader(LeqFileKind kind);
     // Writes one row to the file its level count selects; rolls over to a new part when the
@@ -58,6 +60,7 @@ private:
         std::string name;             // part 0; the base of the roll-over names
         std::string header;           // formatted header block
         std::uint32_t bandCount = 1;  // columns of the octave file
+        std::string extraColumn;      // title of the column after the bands, if any
         std::uint32_t lines = 0;
         std::uint32_t part = 0;
     };
