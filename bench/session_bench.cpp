@@ -68,7 +68,8 @@ void runSession(benchmark::State& state, const std::vector<std::string>& options
     for (auto _ : state) {
         std::string output;
         platform::Console console(&output);
-        const int status = orv::runOrvCmd(static_cast<int>(argv.size()), argv.data(), console, 0);
+        const int status = orv::runOrvCmd(static_cast<int>(argv.size()), argv.data(), console,
+                                          orv::RunEnvironment{});
         if (status != 0) state.SkipWithError("run failed");
         benchmark::DoNotOptimize(output);
     }

@@ -5,5 +5,7 @@
 
 int main(int argc, char** argv) {
     platform::Console console;
-    return orv::runOrvCmd(argc, argv, console, platform::vectorKernelStartup());
+    orv::RunEnvironment environment;
+    environment.vectorStartupStatus = platform::vectorKernelStartup();
+    return orv::runOrvCmd(argc, argv, console, environment);
 }

@@ -12,10 +12,10 @@ namespace orv {
 
 namespace {
 
-int run(RunState& state, int argc, const char* const* argv, int vectorStartupStatus) {
+int run(RunState& state, int argc, const char* const* argv) {
     platform::Console& out = state.out;
-    if (initDefaults(state.settings, state.searchPaths, state.sessions, vectorStartupStatus, out) ==
-        0) {
+    if (initDefaults(state.settings, state.searchPaths, state.sessions,
+                     state.env.vectorStartupStatus, out) == 0) {
         return kExitRefused;
     }
     platform::makeStdoutUnbuffered();
@@ -34,7 +34,7 @@ int run(RunState& state, int argc, const char* const* argv, int vectorStartupSta
 
     std::uint32_t processed = 0;
     {
-        SessionProcessor processor(state.settings, out);
+        SessionProcessor processor(state.settings, out, state.analysis, state.env.audio);
         for (std::uint32_t i = 0; i < found; ++i) {
             if (i < state.sessions.count()) {
                 processor.processSession(state.sessions.entries[i], pipe);
@@ -52,11 +52,12 @@ int run(RunState& state, int argc, const char* const* argv, int vectorStartupSta
 
 }  // namespace
 
-int runOrvCmd(int argc, const char* const* argv, platform::Console& out, int vectorStartupStatus) {
-    RunState state(out);
+int runOrvCmd(int argc, const char* const* argv, platform::Console& out,
+              const RunEnvironment& environment) {
+    RunState state(out, environment);
     int status = kExitNoMemory;
     try {
-        status = run(state, argc, argv, vectorStartupStatus);
+        status = run(state, argc, argv);
     } catch (const std::bad_alloc&) {
         // Work tables that cannot be allocated end the run at once, without a message.
         status = kExitNoMemory;

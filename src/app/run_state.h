@@ -2,20 +2,35 @@
 // (and each test) creates its own.
 #pragma once
 
+#include "analysis/block_worker.h"
 #include "config/processing_settings.h"
 #include "platform/console.h"
+#include "processing/session_driver.h"
 #include "sessions/search_paths.h"
 #include "sessions/session_record.h"
 
 namespace orv {
 
+// What a run takes from the machine it runs on; tests and benchmarks set it.
+struct RunEnvironment {
+    // The vector-kernel start-up status (20: generic code path).
+    int vectorStartupStatus = 0;
+    AudioRunOptions audio;
+    std::chrono::milliseconds filterErrorPause{1000};
+};
+
 struct RunState {
-    explicit RunState(platform::Console& console) : out(console) {}
+    RunState(platform::Console& console, const RunEnvironment& environment)
+        : out(console), env(environment) {
+        analysis.filterErrorPause = environment.filterErrorPause;
+    }
 
     platform::Console& out;
+    RunEnvironment env;
     ProcessingSettings settings;
     SearchPathList searchPaths;
     SessionTable sessions;
+    AnalysisRunState analysis;
 };
 
 // Exit statuses of a run.
@@ -24,7 +39,7 @@ inline constexpr int kExitRefused = -1;  // command line refused, or no percenti
 inline constexpr int kExitNoMemory = 1;  // work tables could not be allocated
 
 // One whole run: start-up, command line, session search, every session, summary.
-// `vectorStartupStatus` is the vector-kernel start-up status (20: generic code path).
-int runOrvCmd(int argc, const char* const* argv, platform::Console& out, int vectorStartupStatus);
+int runOrvCmd(int argc, const char* const* argv, platform::Console& out,
+              const RunEnvironment& environment);
 
 }  // namespace orv

@@ -1,11 +1,13 @@
 #include "processing/session_driver.h"
 
+#include <optional>
+
 #include "platform/directory.h"
 #include "platform/files.h"
+#include "platform/system_info.h"
 #include "processing/record_statistics.h"
-#include "results/general_results.h"
-#include "results/leq_results.h"
-#include "results/result_files.h"
+#include "processing/session_audio.h"
+#include "results/session_result_files.h"
 #include "tweight.h"
 
 namespace orv {
@@ -31,26 +33,50 @@ ResultHeaderInfo SessionProcessor::headerInfo(const SessionRecord& session,
     return info;
 }
 
+platform::ThreadPool& SessionProcessor::pool() {
+    if (!pool_) {
+        const unsigned threads = audioOptions_.workerThreads != 0
+                                     ? audioOptions_.workerThreads
+                                     : platform::logicalProcessorCount();
+        pool_ = std::make_unique<platform::ThreadPool>(threads);
+    }
+    return *pool_;
+}
+
+unsigned SessionProcessor::workerLimit() const {
+    if (audioOptions_.workerLimit != 0) return audioOptions_.workerLimit;
+    // An hour-long block is a whole hour of analysis: one at a time.
+    if (settings_.statsIntervalMin == 0) return 1;
+    return countWorkerThreads(platform::physicalCoreCount(), platform::logicalProcessorCount());
+}
+
 void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe& pipe) {
     const std::uint32_t timeWeighting = generalTimeWeighting(session);
-    const ResultNaming naming(settings_, session, timeWeighting);
-    GeneralResultsWriter general(out_);
-    LeqResultsWriter leq(out_);
-
-    // Result files. Without its general results file a session is skipped; a Leq file
-    // that cannot be created switches short-Leq results off for the rest of the run.
-    naming.prepareSessionDirectory();
-    if (!general.open(naming.general())) return;
+    SessionResultFiles files(settings_, session, timeWeighting, out_);
+    // Without its general results file a session is skipped.
+    if (!files.create()) return;
     if (!platform::isDirectory(session.sessionPath)) return;
-    if (settings_.leqOn() && !leq.open(LeqFileKind::AllPass, naming.leq(LeqFileKind::AllPass, 0))) {
-        settings_.leqInterval = ProcessingSettings::kLeqOff;
-    }
     const bool leqOn = settings_.leqOn();
-    // The files of the audio results (octave band files, octave Leq file, filtered channel
-    // file) are created here, next to the general and Leq files, once the audio analysis
-    // exists; until then -oct, the filter options and -csv produce no files.
+    RecordStatistics statistics(settings_, session.triggerOn != 0, files.general,
+                                leqOn ? &files.leq : nullptr);
 
-    RecordStatistics statistics(settings_, session.triggerOn != 0, general, leqOn ? &leq : nullptr);
+    // The audio: band and filtered-channel analysis on the workers.
+    const BandAnalysisSettings analysis = BandAnalysisSettings::from(settings_, session);
+    const bool analyseBands = analysis.bandCount != 0 || analysis.auxFilterType != 0;
+    PendingIntervalMap pending(files.bands, leqOn ? &files.leq : nullptr);
+    const BlockWorker worker(analysis, pending, analysisState_, out_);
+    std::optional<SessionAudio> audio;
+    if (analyseBands || settings_.rawLevelCsv != 0) {
+        SessionAudio::Options options;
+        options.dispatch.workerLimit = workerLimit();
+        options.dispatch.residentBytes = platform::residentBytes;
+        options.dispatch.reverseOrder = audioOptions_.reverseBlockOrder;
+        options.preRollSeconds = analyseBands ? analysis.preRollSeconds() : 0;
+        AudioDispatcher::Analysis analyse;
+        if (analyseBands) analyse = [&worker](AudioBlock& block) { worker(block); };
+        audio.emplace(session, pool(), std::move(analyse), nullptr, options, out_);
+    }
+
     bool headersWritten = false;
     const std::uint32_t fileCount = session.dataFileCount();
     for (std::uint32_t i = 0; i < fileCount; ++i) {
@@ -69,21 +95,15 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
 
         if (!headersWritten) {
             headersWritten = true;
-            const ResultHeaderInfo info = headerInfo(session, header);
-            if (general.writeHeader(info, timeWeighting) && leqOn) {
-                if (leq.formatHeader(LeqFileKind::AllPass, info, 1)) {
-                    leq.writeColumnHeader(LeqFileKind::AllPass);
-                }
-            }
+            files.writeHeaders(headerInfo(session, header));
         }
 
         for (const LevelRecord& r : records_.records) {
             statistics.sequenceCheck(r, header);
             if (leqOn) statistics.stepShortLeq(r, header);
             if (!statistics.stepGeneralStatistics(r, header)) break;  // rest of the file skipped
-            // Audio branch: the record's 100 ms of audio is gated into the current block, which
-            // is dispatched to the analysis workers when the statistics ask for it.
-            statistics.takeDispatchRequest();
+            const bool boundary = statistics.takeDispatchRequest();
+            if (audio) audio->step(r, header, boundary);
         }
 
         const float percent = static_cast<float>(i + 1) / static_cast<float>(fileCount) * 100.0F;
@@ -96,10 +116,12 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     }
 
     out_.print("\r\n");
-    // The audio analysis waits here for the session's workers and writes what they left.
     statistics.finishSession();
-    general.close();
-    leq.close(LeqFileKind::AllPass);
+    // Nothing of the session outlives it: its blocks are analysed and written before its
+    // files are closed.
+    if (audio) audio->finish();
+    pending.flushAll();
+    files.close();
 }
 
 }  // namespace orv

@@ -61,13 +61,20 @@ std::vector<std::string> listNames(const std::string& dir) {
 }
 
 RunResult runTool(const std::vector<std::string>& args, int vectorStartupStatus) {
+    orv::RunEnvironment environment;
+    environment.vectorStartupStatus = vectorStartupStatus;
+    return runTool(args, environment);
+}
+
+RunResult runTool(const std::vector<std::string>& args, const orv::RunEnvironment& environment) {
     std::vector<const char*> argv{"orv_cmd"};
     for (const std::string& a : args) argv.push_back(a.c_str());
     argv.push_back(nullptr);
     RunResult r;
     platform::Console console(&r.output);
-    r.status = orv::runOrvCmd(static_cast<int>(argv.size() - 1), argv.data(), console,
-                              vectorStartupStatus);
+    orv::RunEnvironment env = environment;
+    env.filterErrorPause = std::chrono::milliseconds(0);
+    r.status = orv::runOrvCmd(static_cast<int>(argv.size() - 1), argv.data(), console, env);
     return r;
 }
 

@@ -4,6 +4,8 @@
 #include <string>
 #include <vector>
 
+#include "app/run_state.h"
+
 namespace testing_support {
 
 // A fresh directory under the system's temporary directory, removed with everything in
@@ -37,8 +39,9 @@ struct RunResult {
 };
 
 // Runs the tool in this process with the given arguments (program name added), capturing
-// everything it prints.
+// everything it prints. Analysis workers run without the filter-error pause.
 RunResult runTool(const std::vector<std::string>& args, int vectorStartupStatus = 0);
+RunResult runTool(const std::vector<std::string>& args, const orv::RunEnvironment& environment);
 
 // Runs the real orv_cmd executable and captures its standard output and exit status
 // (the low 8 bits, as a shell sees them).
