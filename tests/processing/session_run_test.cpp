@@ -8,6 +8,7 @@
 #include <iomanip>
 #include <sstream>
 
+#include "support/result_csv.h"
 #include "support/session_builder.h"
 #include "support/test_support.h"
 
@@ -15,38 +16,7 @@ namespace {
 
 using namespace testing_support;
 
-// The quoted fields of one CSV line.
-std::vector<std::string> fields(const std::string& line) {
-    std::vector<std::string> out;
-    std::size_t i = 0;
-    while (i < line.size()) {
-        if (line[i] != '"') break;
-        const std::size_t end = line.find('"', i + 1);
-        out.push_back(line.substr(i + 1, end - i - 1));
-        i = end + 2;  // past the quote and the comma
-    }
-    return out;
-}
-
-// The data rows of a result file (after the 21 header lines), as fields.
-std::vector<std::vector<std::string>> rows(const std::string& path) {
-    std::istringstream in(readFile(path));
-    std::string line;
-    std::vector<std::vector<std::string>> out;
-    for (int n = 0; std::getline(in, line); ++n) {
-        EXPECT_FALSE(line.empty() || line.back() != '\r') << "line " << n << " of " << path;
-        if (n >= 21) out.push_back(fields(line));
-    }
-    return out;
-}
-
-std::vector<std::string> headerLines(const std::string& path) {
-    std::istringstream in(readFile(path));
-    std::vector<std::string> out;
-    std::string line;
-    while (out.size() < 21 && std::getline(in, line)) out.push_back(line);
-    return out;
-}
+std::vector<std::vector<std::string>> rows(const std::string& path) { return resultRows(path); }
 
 // Rows for the 100 ms slots [first, last] of an hour, every level set to `level(slot)`.
 std::vector<LevelRow> levelRows(std::size_t first, std::size_t last,
