@@ -1,0 +1,61 @@
+// Demo sessions through the whole audio path: every second of audio that orv_cmd analyses
+// is the second the logger measured, in plain, triggered and split sessions.
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <map>
+
+#include "orv_demo/demo_session.h"
+#include "support/result_csv.h"
+#include "support/test_support.h"
+
+namespace {
+
+using namespace testing_support;
+
+// "AP Leq" per time stamp of the all-pass Leq file (the logger's own 100 ms levels) and the
+// all-pass A channel's Leq of the octave Leq file (the audio), second by second.
+TEST(DemoAudio, EveryAnalysedSecondIsTheSecondTheLoggerMeasured) {
+    struct Case {
+        const char* name;
+        bool triggered;
+        std::int64_t split;
+    };
+    for (const Case& c : {Case{"Plain", false, 0}, Case{"Trig", true, 0}, Case{"Split", true, 7}}) {
+        TempDir dir;
+        orv_demo::DemoOptions o;
+        o.outDir = dir / "sessions";
+        o.name = c.name;
+        o.durationSeconds = 150;
+        o.triggered = c.triggered;
+        o.splitSeconds = c.split;
+        const orv_demo::DemoSummary demo = orv_demo::generateDemoSession(o);
+        const RunResult r = runTool({"-s", dir / "sessions", "-d", dir / "out", "-i", "1", "-leq",
+                                     "1", "-oct", "1", "Z", "F", "-apf", "A", "F"});
+        ASSERT_EQ(r.status, 0) << r.output;
+        EXPECT_EQ(r.output.find("ERR"), std::string::npos) << r.output;
+
+        std::map<std::string, double> logger;
+        for (const auto& row : resultRows(dir / ("out/" + std::string(c.name) + "_LEQ.csv"))) {
+            logger[row[1]] = std::stod(row[2]);
+        }
+        const auto audio = resultRows(dir / ("out/" + std::string(c.name) + "_LEQ1OCT.csv"));
+        // Untriggered: every second of the closed intervals; triggered: the recorded ones.
+        EXPECT_GE(audio.size(), c.triggered ? std::size_t{20} : std::size_t{120}) << c.name;
+        EXPECT_GE(demo.plan.recordings.size(), c.triggered ? 2U : 1U) << c.name;
+        int previous = -10;
+        for (const auto& row : audio) {
+            const std::string& time = row[1];  // 'hh:mm:ss.0
+            ASSERT_TRUE(logger.count(time)) << c.name << " " << time;
+            const int second = std::stoi(time.substr(1, 2)) * 3600 +
+                               std::stoi(time.substr(4, 2)) * 60 + std::stoi(time.substr(7, 2));
+            // A recording's first second holds the meter's start-up.
+            if (second == previous + 1) {
+                EXPECT_NEAR(std::stod(row[14]), logger[time], 0.3) << c.name << " " << time;
+            }
+            previous = second;
+        }
+    }
+}
+
+}  // namespace
