@@ -13,9 +13,11 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <set>
 #include <string>
 #include <vector>
 
+#include "analysis/raw_export.h"
 #include "app/run_state.h"
 #include "input/level_data.h"
 #include "platform/files.h"
@@ -85,8 +87,9 @@ double seconds(Clock::time_point since) {
 }
 
 // Gates every record of the level file, dispatching at 15-minute boundaries; the work items
-// only read their block's audio in one-minute pieces.
-double gateReadDispatch(const std::string& sessionDir) {
+// only read their block's audio in one-minute pieces. With `rawExport`, every block is
+// turned into hourly raw levels instead (on this thread, as in a run).
+double gateReadDispatch(const std::string& sessionDir, bool rawExport) {
     orv::SessionRecord session;
     session.sessionPath = sessionDir + "/";
     session.waveFiles = {"data.000/20240305_120000.wav"};
@@ -104,19 +107,21 @@ double gateReadDispatch(const std::string& sessionDir) {
     orv::SessionAudio::Options options;
     options.dispatch.workerLimit = 2;
     options.preRollSeconds = 3;
+    std::set<std::string> written;
+    orv::HourlyRawFiles files(sessionDir + "/", written, console);
+    orv::RawLevelExport exporter(10.0F, 1.0F, files, console);
     const auto start = Clock::now();
     {
-        orv::SessionAudio audio(
-            session, pool,
-            [](orv::AudioBlock& b) {
-                std::vector<std::int16_t> piece(2880000);
-                for (std::uint64_t at = 0; at < b.sampleCount(); at += piece.size()) {
-                    const auto n = static_cast<std::size_t>(
-                        std::min<std::uint64_t>(piece.size(), b.sampleCount() - at));
-                    if (!b.audio.read(at, n, piece.data())) std::abort();
-                }
-            },
-            nullptr, options, console);
+        orv::AudioDispatcher::Analysis readOnly = [](orv::AudioBlock& b) {
+            std::vector<std::int16_t> piece(2880000);
+            for (std::uint64_t at = 0; at < b.sampleCount(); at += piece.size()) {
+                const auto n = static_cast<std::size_t>(
+                    std::min<std::uint64_t>(piece.size(), b.sampleCount() - at));
+                if (!b.audio.read(at, n, piece.data())) std::abort();
+            }
+        };
+        orv::SessionAudio audio(session, pool, rawExport ? nullptr : readOnly,
+                                rawExport ? &exporter : nullptr, options, console);
         for (const orv::LevelRecord& r : records.records) {
             audio.step(r, header, r.tenth == 0 && r.second == 0 && r.minute % 15 == 0);
         }
@@ -127,6 +132,7 @@ double gateReadDispatch(const std::string& sessionDir) {
         last.tenth = 0;
         audio.step(last, header, true);
         audio.finish();
+        exporter.finish();
     }
     return seconds(start);
 }
@@ -180,11 +186,14 @@ int main(int argc, char** argv) {
 
     readOnce(wave);  // into the page cache, as every figure below reads from it
     const double read = readOnce(wave);
-    const double gate = gateReadDispatch(dir);
+    const double gate = gateReadDispatch(dir, false);
+    const double raw = gateReadDispatch(dir, true);
     std::printf("%.1f MB of audio (%u min)\n", mb, minutes);
     std::printf("one read of the file:              %8.0f MB/s\n", mb / read);
     std::printf("gate, dispatch, read in 1 min:     %8.0f MB/s  (%.2fx the single read's time)\n",
                 mb / gate, gate / read);
+    std::printf("hourly raw levels (-csv):          %8.0f records/s, %.0fx real time\n",
+                audioSeconds * 10.0 / raw, audioSeconds / raw);
 
     const std::vector<std::string> bands{"-oct", "3", "Z", "F", "-bpf", "500", "2000", "A", "F"};
     std::printf("\nwhole run, -oct 3 Z F -bpf 500 2000 A F:\n");

@@ -4,6 +4,8 @@
 
 #include <atomic>
 #include <chrono>
+#include <set>
+#include <string>
 
 #include "analysis/band_analysis.h"
 #include "platform/console.h"
@@ -12,11 +14,14 @@
 
 namespace orv {
 
-// Lives for the whole run: a meter set-up failure is explained once per run.
+// What the audio analysis keeps for the whole run.
 struct AnalysisRunState {
+    // A meter set-up failure is explained once per run.
     std::atomic<bool> filterErrorShown{false};
     // Pause after the explanation, so that it can be read before the run goes on.
     std::chrono::milliseconds filterErrorPause{1000};
+    // Hourly raw level files written so far (driver thread only).
+    std::set<std::string> rawFilesWritten;
 };
 
 class BlockWorker {

@@ -186,6 +186,7 @@ WaveCursor::Decision WaveCursor::finish(bool accepted, bool continuesRecording, 
                                         const AudioSpans& period) {
     Decision d;
     d.accepted = accepted;
+    d.continuesRecording = accepted && continuesRecording;
     if (accepted) {
         if (!continuesRecording) history_.clear();
         history_.push_back(PastPeriod{period, mark});

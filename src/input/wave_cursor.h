@@ -40,6 +40,8 @@ public:
         // The block gathered so far ends before this record: a triggered recording's range
         // was left, or a new recording starts right after the previous one.
         bool endsBlock = false;
+        // An accepted period directly follows the previous one in the same recording.
+        bool continuesRecording = false;
     };
 
     // Gates the record's 100 ms of audio. When accepted, `period` holds its 4800 samples.

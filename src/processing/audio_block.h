@@ -17,6 +17,7 @@ struct BlockPeriod {
     platform::SystemTime time;  // end of the period (the tenth in milliseconds, x 100)
     float battery = 0.0F;       // the record's battery reading
     std::uint32_t status = 0;   // 1: the record was overloaded
+    std::uint32_t header = 0;   // index of its data file's header in AudioBlock::headers
 };
 
 struct AudioBlock {
@@ -26,25 +27,26 @@ struct AudioBlock {
     // Date and hour of the data file, minute and second of the last record offered to the
     // block, accepted or not, and its tenth of a second in the milliseconds field.
     platform::SystemTime time;
-    AudioSpans audio;                  // 4800 samples per accepted record
-    std::vector<std::uint32_t> marks;  // per accepted record: 1 = other gain range
-    std::vector<BlockPeriod> periods;  // per accepted record
+    AudioSpans audio;                     // 4800 samples per accepted record
+    std::vector<std::uint32_t> marks;     // per accepted record: 1 = other gain range
+    std::vector<BlockPeriod> periods;     // per accepted record
+    std::vector<DataFileHeader> headers;  // of the data files the records came from
     // The audio of the same recording just before the block, and its marks.
     AudioSpans preRoll;
     std::vector<std::uint32_t> preRollMarks;
+    // The first period directly follows earlier audio of the same recording.
+    bool continuesRecording = false;
     float minBattery = 15.0F;       // lowest battery reading of the accepted records
     float temperature = 0.0F;       // of the data file, at dispatch
     std::uint32_t statusFlags = 0;  // OR of the accepted records' status
 
     std::size_t periodCount() const { return marks.size(); }
     std::uint64_t sampleCount() const { return std::uint64_t{marks.size()} * kPeriodSamples; }
-    // The block's first period directly follows earlier audio of the same recording.
-    bool continuesRecording() const { return !preRoll.empty(); }
 
     // Stamps the block with a record offered to it.
     void stamp(const LevelRecord& r, const DataFileHeader& header);
-    // Adds an accepted record and its audio.
-    void add(const LevelRecord& r, const AudioSpans& period);
+    // Adds an accepted record (stamped first) and its audio.
+    void add(const LevelRecord& r, const DataFileHeader& header, const AudioSpans& period);
 };
 
 }  // namespace orv

@@ -17,9 +17,11 @@ void SessionAudio::step(const LevelRecord& r, const DataFileHeader& header, bool
     if (d.endsBlock && d.accepted) dispatchBlock(header);
     block_->stamp(r, header);
     if (d.accepted) {
-        if (block_->periodCount() == 0)
+        if (block_->periodCount() == 0) {
+            block_->continuesRecording = d.continuesRecording;
             cursor_.precedingAudio(block_->preRoll, block_->preRollMarks);
-        block_->add(r, period_);
+        }
+        block_->add(r, header, period_);
     }
     if ((d.endsBlock && !d.accepted) || atBoundary) dispatchBlock(header);
 }

@@ -2,6 +2,7 @@
 
 #include <optional>
 
+#include "analysis/raw_export.h"
 #include "platform/directory.h"
 #include "platform/files.h"
 #include "platform/system_info.h"
@@ -65,6 +66,10 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     const bool analyseBands = analysis.bandCount != 0 || analysis.auxFilterType != 0;
     PendingIntervalMap pending(files.bands, leqOn ? &files.leq : nullptr);
     const BlockWorker worker(analysis, pending, analysisState_, out_);
+    // The hourly raw levels, from every block before it is queued.
+    HourlyRawFiles rawFiles(files.naming().directory(), analysisState_.rawFilesWritten, out_);
+    RawLevelExport rawExport(analysis.calibrationGain, analysis.rangeMultiplier, rawFiles, out_);
+    BlockObserver* observer = settings_.rawLevelCsv != 0 ? &rawExport : nullptr;
     std::optional<SessionAudio> audio;
     if (analyseBands || settings_.rawLevelCsv != 0) {
         SessionAudio::Options options;
@@ -74,7 +79,7 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
         options.preRollSeconds = analyseBands ? analysis.preRollSeconds() : 0;
         AudioDispatcher::Analysis analyse;
         if (analyseBands) analyse = [&worker](AudioBlock& block) { worker(block); };
-        audio.emplace(session, pool(), std::move(analyse), nullptr, options, out_);
+        audio.emplace(session, pool(), std::move(analyse), observer, options, out_);
     }
 
     bool headersWritten = false;
@@ -120,6 +125,7 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     // Nothing of the session outlives it: its blocks are analysed and written before its
     // files are closed.
     if (audio) audio->finish();
+    if (observer != nullptr) rawExport.finish();
     pending.flushAll();
     files.close();
 }

@@ -28,14 +28,14 @@ const char* bandName(std::uint32_t band, std::uint32_t bandCount) {
 
 }  // namespace
 
-std::string ResultNaming::prefix() const {
+std::string ResultNaming::directory() const {
     if (settings_.binMode == 0) return settings_.outputDir;
     return settings_.outputDir + session_.sessionName + platform::kPathSeparator;
 }
 
 std::string ResultNaming::prepareSessionDirectory() const {
     if (settings_.binMode == 0) return {};
-    const std::string dir = prefix();
+    const std::string dir = directory();
     platform::makeDirectory(dir);
     return dir;
 }
@@ -45,7 +45,7 @@ std::string ResultNaming::general() const {
     if (settings_.binMode == 0) {
         b.append("%s%s.csv", settings_.outputDir.c_str(), session_.sessionName.c_str());
     } else {
-        b.append("%sGEN_%s_%u_%s.csv", prefix().c_str(),
+        b.append("%sGEN_%s_%u_%s.csv", directory().c_str(),
                  SlmLibrary::FWeight::shortName(settings_.generalWeighting),
                  displayInterval(settings_.statsIntervalMin),
                  SlmLibrary::TWeight::shortName(generalTimeWeighting_));
@@ -60,12 +60,12 @@ std::string ResultNaming::leq(LeqFileKind kind, std::uint32_t octaveBandCount) c
         b.append("%s%s_LEQ%s.csv", settings_.outputDir.c_str(), session_.sessionName.c_str(),
                  suffix);
     } else if (kind == LeqFileKind::AllPass) {
-        b.append("%sLEQ%s_%s_%u_%s.csv", prefix().c_str(), suffix,
+        b.append("%sLEQ%s_%s_%u_%s.csv", directory().c_str(), suffix,
                  SlmLibrary::FWeight::shortName(settings_.generalWeighting),
                  displayInterval(settings_.leqInterval),
                  SlmLibrary::TWeight::shortName(generalTimeWeighting_));
     } else {
-        b.append("%sLEQ%s_%s_%u_%s.csv", prefix().c_str(), suffix,
+        b.append("%sLEQ%s_%s_%u_%s.csv", directory().c_str(), suffix,
                  SlmLibrary::FWeight::shortName(settings_.octaveFreqWeighting),
                  displayInterval(settings_.leqInterval),
                  SlmLibrary::TWeight::shortName(settings_.octaveTimeWeighting));
@@ -79,7 +79,7 @@ std::string ResultNaming::octaveBand(std::uint32_t band, std::uint32_t bandCount
         b.append("%s%s_%s.csv", settings_.outputDir.c_str(), session_.sessionName.c_str(),
                  bandName(band, bandCount));
     } else {
-        b.append("%s%s%s_%s_%u_%s.csv", prefix().c_str(), octaveLabel(bandCount),
+        b.append("%s%s%s_%s_%u_%s.csv", directory().c_str(), octaveLabel(bandCount),
                  bandName(band, bandCount),
                  SlmLibrary::FWeight::shortName(settings_.octaveFreqWeighting),
                  displayInterval(settings_.statsIntervalMin),
@@ -94,8 +94,8 @@ std::string ResultNaming::filtered() const {
         b.append("%s%s_%s.csv", settings_.outputDir.c_str(), session_.sessionName.c_str(),
                  filterName(settings_.auxFilterType));
     } else {
-        b.append("%s%s-%u-%u_%s_%u_%s.csv", prefix().c_str(), filterName(settings_.auxFilterType),
-                 static_cast<unsigned>(settings_.auxFreq1),
+        b.append("%s%s-%u-%u_%s_%u_%s.csv", directory().c_str(),
+                 filterName(settings_.auxFilterType), static_cast<unsigned>(settings_.auxFreq1),
                  static_cast<unsigned>(settings_.auxFreq2),
                  SlmLibrary::FWeight::shortName(settings_.auxFreqWeighting),
                  displayInterval(settings_.statsIntervalMin),

@@ -40,10 +40,11 @@ public:
     // The per-session directory of the sub-directory layout, created when missing (errors
     // are left to the file creation that follows). Empty in the flat layout.
     std::string prepareSessionDirectory() const;
+    // Where the session's files go: the output directory (flat) or the session directory,
+    // ending with the path separator.
+    std::string directory() const;
 
 private:
-    std::string prefix() const;  // the output directory (flat) or the session directory
-
     const ProcessingSettings& settings_;
     const SessionRecord& session_;
     std::uint32_t generalTimeWeighting_;

@@ -27,6 +27,7 @@ public:
     // Header blocks and column lines, general file first; a failure stops the rest.
     void writeHeaders(const ResultHeaderInfo& info);
     void close();
+    const ResultNaming& naming() const { return naming_; }
 
     GeneralResultsWriter general;
     LeqResultsWriter leq;

@@ -1,10 +1,12 @@
 // Demo sessions through the whole audio path: every second of audio that orv_cmd analyses
-// is the second the logger measured, in plain, triggered and split sessions.
+// is the second the logger measured, and the hourly raw levels computed from the audio are
+// the logger's own levels, in plain, triggered and split sessions.
 #include <gtest/gtest.h>
 
 #include <cmath>
 #include <map>
 
+#include "input/level_data.h"
 #include "orv_demo/demo_session.h"
 #include "support/result_csv.h"
 #include "support/test_support.h"
@@ -12,6 +14,20 @@
 namespace {
 
 using namespace testing_support;
+
+// The records of a level data file (the logger's or an hourly raw file) by slot of the hour.
+std::map<unsigned, orv::LevelRecord> levelRecords(const std::string& path) {
+    const std::string text = readFile(path);
+    orv::DataFileHeader header;
+    std::size_t first = 0;
+    EXPECT_TRUE(orv::parseDataFileHeader(text.data(), text.size(), header, first)) << path;
+    orv::LevelRecordQueue queue;
+    orv::decodeLevelRecords(text.data() + first, text.size() - first, queue);
+    std::map<unsigned, orv::LevelRecord> out;
+    for (const orv::LevelRecord& r : queue.records)
+        out[r.minute * 600U + r.second * 10U + r.tenth] = r;
+    return out;
+}
 
 // "AP Leq" per time stamp of the all-pass Leq file (the logger's own 100 ms levels) and the
 // all-pass A channel's Leq of the octave Leq file (the audio), second by second.
@@ -31,7 +47,7 @@ TEST(DemoAudio, EveryAnalysedSecondIsTheSecondTheLoggerMeasured) {
         o.splitSeconds = c.split;
         const orv_demo::DemoSummary demo = orv_demo::generateDemoSession(o);
         const RunResult r = runTool({"-s", dir / "sessions", "-d", dir / "out", "-i", "1", "-leq",
-                                     "1", "-oct", "1", "Z", "F", "-apf", "A", "F"});
+                                     "1", "-oct", "1", "Z", "F", "-apf", "A", "F", "-csv"});
         ASSERT_EQ(r.status, 0) << r.output;
         EXPECT_EQ(r.output.find("ERR"), std::string::npos) << r.output;
 
@@ -55,6 +71,30 @@ TEST(DemoAudio, EveryAnalysedSecondIsTheSecondTheLoggerMeasured) {
             }
             previous = second;
         }
+
+        // The hourly raw levels against the logger's, record by record, past the first
+        // second of each recording (where the logger's meter had run on before).
+        std::size_t compared = 0;
+        for (const std::string& hour : demo.levelFiles) {
+            if (!exists(dir / ("out/" + hour))) continue;
+            const auto raw = levelRecords(dir / ("out/" + hour));
+            const auto own = levelRecords(demo.plan.sessionDir + "/data.000/" + hour);
+            unsigned previousSlot = 0, run = 0;
+            for (const auto& [slot, rec] : raw) {
+                run = slot == previousSlot + 1 ? run + 1 : 0;
+                previousSlot = slot;
+                ASSERT_TRUE(own.count(slot)) << hour << " " << slot;
+                if (run < 10) continue;
+                const orv::LevelRecord& mine = own.at(slot);
+                EXPECT_NEAR(rec.splA, mine.splA, 0.2) << c.name << " " << hour << " " << slot;
+                EXPECT_NEAR(rec.splC, mine.splC, 0.2) << c.name << " " << hour << " " << slot;
+                EXPECT_NEAR(rec.leqA, mine.leqA, 0.2) << c.name << " " << hour << " " << slot;
+                EXPECT_NEAR(rec.leqC, mine.leqC, 0.2) << c.name << " " << hour << " " << slot;
+                EXPECT_EQ(rec.status, mine.status) << c.name << " " << hour << " " << slot;
+                ++compared;
+            }
+        }
+        EXPECT_GE(compared, c.triggered ? 150U : 1100U) << c.name;
     }
 }
 
