@@ -8,7 +8,12 @@ SessionAudio::SessionAudio(const SessionRecord& session, platform::ThreadPool& p
     : cursor_(session, std::size_t{options.preRollSeconds} * 10, out),
       dispatcher_(pool, std::move(analysis), options.dispatch),
       observer_(observer),
-      block_(std::make_unique<AudioBlock>()) {}
+      block_(std::make_unique<AudioBlock>()) {
+    if (session.waveFileCount() == 0) {
+        out.print("ERR: No wave files in %s - no results from audio for this session\r\n",
+                  session.sessionPath.c_str());
+    }
+}
 
 void SessionAudio::step(const LevelRecord& r, const DataFileHeader& header, bool atBoundary) {
     const WaveCursor::Decision d = cursor_.gate(r, header, period_);

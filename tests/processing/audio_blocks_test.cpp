@@ -232,4 +232,11 @@ TEST_F(Blocks, TriggeredRecordingsEndTheirBlocks) {
     EXPECT_TRUE(blocks_[1].preRoll.empty());
 }
 
+TEST_F(Blocks, ASessionWithoutWaveFilesSaysSo) {
+    feed(40, 10);
+    EXPECT_TRUE(blocks_.empty());
+    EXPECT_EQ(printed_, "ERR: No wave files in " + dir_.path() +
+                            "/ - no results from audio for this session\r\n");
+}
+
 }  // namespace
