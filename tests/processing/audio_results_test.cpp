@@ -160,16 +160,28 @@ TEST_F(AudioRun, ShortLeqRowsCoverTheOddPartFirst) {
 }
 
 TEST_F(AudioRun, OutputIsTheSameForAnyWorkerCountAndFinishingOrder) {
-    const std::size_t n = 200 * 48000;
-    std::vector<std::int16_t> noise = markedSamples(7, n);
-    for (std::size_t i = 0; i < n; ++i) {
-        // Noise whose level changes every few seconds, under two tones.
-        noise[i] = static_cast<std::int16_t>(noise[i] / (4 << (i / 240000 % 5)));
+    // A triggered session of twelve 5 s recordings, each its own block (-trg C): noise whose
+    // level changes every second under two tones.
+    SessionLayout layout = namedSession("Same");
+    layout.info.trigSetting = "ON";
+    layout.info.trigPreRecLength = "0";
+    layout.levelFiles[0].rows = makeRows(800, 1);
+    const std::string dir = writeSession(dir_ / "sessions/Same", layout);
+    const std::size_t n = 5 * 48000;
+    for (unsigned k = 0; k < 12; ++k) {
+        std::vector<std::int16_t> noise = markedSamples(k, n);
+        for (std::size_t i = 0; i < n; ++i) {
+            noise[i] = static_cast<std::int16_t>(noise[i] / (4 << ((i / 48000 + k) % 5)));
+        }
+        char name[32];
+        std::snprintf(name, sizeof name, "20200917_08%02u%02u.wav", (1 + 6 * k) / 60,
+                      (1 + 6 * k) % 60);
+        writeWaveFile(dir + "/data.000/" + name,
+                      mix({noise, toneSamples(k125, 3000.0, n), toneSamples(k2k, 500.0, n)}));
     }
-    addSession("Same", mix({noise, toneSamples(k125, 3000.0, n), toneSamples(k2k, 500.0, n)}));
-    const std::vector<std::string> options{"-oct", "3",  "Z",  "S",  "-bpf", "500",
-                                           "2000", "A",  "F",  "-i", "1",    "-leq",
-                                           "4",    "-p", "10", "50", "90"};
+    const std::vector<std::string> options{"-oct", "3",  "Z",  "S",  "-bpf", "500", "2000",
+                                           "A",    "F",  "-i", "1",  "-trg", "C",   "-leq",
+                                           "1",    "-p", "10", "50", "90"};
     orv::RunEnvironment one;
     one.audio.workerThreads = 1;
     one.audio.workerLimit = 1;
@@ -184,7 +196,11 @@ TEST_F(AudioRun, OutputIsTheSameForAnyWorkerCountAndFinishingOrder) {
     ASSERT_EQ(run(out() + "R", options, reverse).status, 0);
     const auto names = listNames(out() + "1");
     ASSERT_EQ(names.size(), 40U);  // general, 2 Leq, 36 bands, filtered
-    EXPECT_EQ(resultRows(out() + "1/Same_1kHz.csv").size(), 3U);
+    const auto rows = resultRows(out() + "1/Same_1kHz.csv");
+    ASSERT_EQ(rows.size(), 12U);
+    EXPECT_EQ(rows[0][1], "08:00:06");  // stamped by the first record after the recording
+    EXPECT_EQ(rows[11][1], "08:01:12");
+    EXPECT_EQ(resultRows(out() + "1/Same_LEQ3OCT.csv").size(), 60U);
     for (const std::string& name : names) {
         const std::string expected = readFile(out() + "1/" + name);
         EXPECT_EQ(readFile(out() + "N/" + name), expected) << name;
