@@ -42,11 +42,16 @@ std::size_t File::write(const void* data, std::size_t size, int* error) {
     return done;
 }
 
-std::size_t File::read(void* data, std::size_t size, int* error) {
+namespace {
+
+// Calls `once(buffer, count, done)` (one read of at most count bytes) until `size` bytes have
+// arrived, the end of the file is reached or an error other than an interruption occurs.
+template <typename ReadOnce>
+std::size_t readFully(void* data, std::size_t size, int* error, ReadOnce once) {
     char* p = static_cast<char*>(data);
     std::size_t done = 0;
     while (done < size) {
-        const ssize_t r = ::read(fd_, p + done, size - done);
+        const ssize_t r = once(p + done, size - done, done);
         if (r < 0) {
             if (errno == EINTR) continue;
             if (error != nullptr) *error = errno;
@@ -58,20 +63,17 @@ std::size_t File::read(void* data, std::size_t size, int* error) {
     return done;
 }
 
+}  // namespace
+
+std::size_t File::read(void* data, std::size_t size, int* error) {
+    return readFully(data, size, error,
+                     [this](char* p, std::size_t n, std::size_t) { return ::read(fd_, p, n); });
+}
+
 std::size_t File::readAt(std::uint64_t offset, void* data, std::size_t size, int* error) const {
-    char* p = static_cast<char*>(data);
-    std::size_t done = 0;
-    while (done < size) {
-        const ssize_t r = ::pread(fd_, p + done, size - done, static_cast<off_t>(offset + done));
-        if (r < 0) {
-            if (errno == EINTR) continue;
-            if (error != nullptr) *error = errno;
-            break;
-        }
-        if (r == 0) break;
-        done += static_cast<std::size_t>(r);
-    }
-    return done;
+    return readFully(data, size, error, [this, offset](char* p, std::size_t n, std::size_t done) {
+        return ::pread(fd_, p, n, static_cast<off_t>(offset + done));
+    });
 }
 
 bool File::seekRelative(std::int64_t offset) {
