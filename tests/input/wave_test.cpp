@@ -14,7 +14,7 @@ using orv::WaveCursor;
 TEST(WaveHeader, AcceptsTheLoggerLayoutsAndRefusesOthers) {
     const std::vector<std::int16_t> audio(10, 7);
     struct Case {
-        WaveSpec spec;
+        WaveLayout layout;
         bool parses;
         std::uint32_t headerLength;
         bool analysable;
@@ -29,14 +29,14 @@ TEST(WaveHeader, AcceptsTheLoggerLayoutsAndRefusesOthers) {
         {{.formatTag = 3}, true, 44, false},  // float samples
     };
     for (const Case& c : cases) {
-        const std::string bytes = waveFileBytes(audio, c.spec);
+        const std::string bytes = waveFileBytes(audio, c.layout);
         orv::WaveHeader h;
         const auto* data = reinterpret_cast<const unsigned char*>(bytes.data());
-        ASSERT_EQ(orv::parseWaveHeader(data, bytes.size(), h), c.parses) << c.spec.listBodyBytes;
+        ASSERT_EQ(orv::parseWaveHeader(data, bytes.size(), h), c.parses) << c.layout.listBodyBytes;
         if (!c.parses) continue;
         EXPECT_EQ(h.headerLength, c.headerLength);
         EXPECT_EQ(h.dataSize, 20U);
-        EXPECT_EQ(orv::isAnalysableFormat(h.format), c.analysable) << c.spec.sampleRate;
+        EXPECT_EQ(orv::isAnalysableFormat(h.format), c.analysable) << c.layout.sampleRate;
     }
     orv::WaveHeader h;
     for (std::size_t n : {0, 11, 43}) {
@@ -86,8 +86,8 @@ TEST(WaveName, DateAndTimeFromTheName) {
 class Cursor : public ::testing::Test {
 protected:
     void addWave(const std::string& name, const std::vector<std::int16_t>& samples,
-                 const WaveSpec& spec = {}) {
-        writeWaveFile(dir_ / ("data.000/" + name), samples, spec);
+                 const WaveLayout& layout = {}) {
+        writeWaveFile(dir_ / ("data.000/" + name), samples, layout);
         session_.waveFiles.push_back("data.000/" + name);
     }
     void triggered(unsigned preRecord) {

@@ -20,34 +20,34 @@ void put32(std::string& s, std::uint32_t v) {
 
 }  // namespace
 
-std::string waveFileBytes(const std::vector<std::int16_t>& samples, const WaveSpec& spec) {
-    const std::uint32_t blockAlign = spec.channels * spec.bitsPerSample / 8U;
+std::string waveFileBytes(const std::vector<std::int16_t>& samples, const WaveLayout& layout) {
+    const std::uint32_t blockAlign = layout.channels * layout.bitsPerSample / 8U;
     const auto dataSize = static_cast<std::uint32_t>(samples.size() * 2);
     std::string s = "RIFF";
     put32(s, 36 + dataSize);
     s += "WAVE";
-    if (spec.listBodyBytes >= 0) {
+    if (layout.listBodyBytes >= 0) {
         s += "LIST";
-        put32(s, static_cast<std::uint32_t>(spec.listBodyBytes));
-        s.append(static_cast<std::size_t>(spec.listBodyBytes), 'x');
+        put32(s, static_cast<std::uint32_t>(layout.listBodyBytes));
+        s.append(static_cast<std::size_t>(layout.listBodyBytes), 'x');
     }
     s += "fmt ";
     put32(s, 16);
-    put16(s, spec.formatTag);
-    put16(s, spec.channels);
-    put32(s, spec.sampleRate);
-    put32(s, spec.sampleRate * blockAlign);
+    put16(s, layout.formatTag);
+    put16(s, layout.channels);
+    put32(s, layout.sampleRate);
+    put32(s, layout.sampleRate * blockAlign);
     put16(s, blockAlign);
-    put16(s, spec.bitsPerSample);
+    put16(s, layout.bitsPerSample);
     s += "data";
-    put32(s, static_cast<std::uint32_t>(dataSize + spec.dataSizeDelta));
+    put32(s, static_cast<std::uint32_t>(dataSize + layout.dataSizeDelta));
     for (std::int16_t v : samples) put16(s, static_cast<std::uint16_t>(v));
     return s;
 }
 
 void writeWaveFile(const std::string& path, const std::vector<std::int16_t>& samples,
-                   const WaveSpec& spec) {
-    writeFile(path, waveFileBytes(samples, spec));
+                   const WaveLayout& layout) {
+    writeFile(path, waveFileBytes(samples, layout));
 }
 
 std::vector<std::int16_t> markedSamples(std::uint32_t seed, std::size_t count) {

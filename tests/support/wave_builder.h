@@ -8,7 +8,7 @@
 
 namespace testing_support {
 
-struct WaveSpec {
+struct WaveLayout {
     std::uint16_t formatTag = 1;
     std::uint16_t channels = 1;
     std::uint32_t sampleRate = 48000;
@@ -18,9 +18,9 @@ struct WaveSpec {
 };
 
 // The whole file: header and samples (little-endian).
-std::string waveFileBytes(const std::vector<std::int16_t>& samples, const WaveSpec& spec = {});
+std::string waveFileBytes(const std::vector<std::int16_t>& samples, const WaveLayout& layout = {});
 void writeWaveFile(const std::string& path, const std::vector<std::int16_t>& samples,
-                   const WaveSpec& spec = {});
+                   const WaveLayout& layout = {});
 
 // `count` samples that differ from those of any other seed and position: sample i of seed s
 // is a hash of (s, i).
