@@ -92,6 +92,7 @@ private:
     std::array<bool, W> active_{};
     std::array<bool, W> interpolate_{};
     bool anyInterpolated_ = false;
+    bool lowHalfOnly_ = false;                  // lanes 4.. unused
     std::array<std::uint64_t, W> settleEnd_{};  // first sample after filter settling
     std::array<std::uint64_t, W> primeEnd_{};   // earliest first settled sample
 
