@@ -199,17 +199,15 @@ void BandLevels<W>::processFast(const float* frames, std::size_t count) {
 template <std::size_t W>
 void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
                                 const std::array<float, W>& magnitude) {
-    // Frames -8 .. -1 from the previous call, then this call's. A sample is interpolated
-    // once four frames after it are known; the last four wait for the next call.
+    // Frames -8 .. -1 from the previous call (tail_), then this call's. A sample is
+    // interpolated once four frames after it are known; the last four wait for the next call.
     const std::size_t total = kHistory + count;
-    if (extended_.size() < total * W) extended_.resize(total * W);
-    std::copy(tail_.begin(), tail_.end(), extended_.begin());
-    std::copy(frames, frames + count * W,
-              extended_.begin() + static_cast<std::ptrdiff_t>(kHistory * W));
     const std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
     const std::size_t end = total - 4;
     const QuarterKernels& k = quarterKernels();
-    const float* x = extended_.data();
+    auto x = [&](std::size_t j, std::size_t l) {
+        return j < kHistory ? tail_[j * W + l] : frames[(j - kHistory) * W + l];
+    };
     // The crest is within half a sample of a sample at least cos(pi / 4) of it for content
     // below a quarter of the rate: samples under 0.7 of the running peak need no look.
     std::array<float, W> best{};
@@ -222,11 +220,11 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
         for (std::size_t base = j - 1; base <= j; ++base) {
             for (int t = 0; t < 3; ++t) {
                 float s = 0.0F;
-                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x[(base - 3 + i) * W + l];
+                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x(base - 3 + i, l);
                 best[l] = std::max(best[l], std::fabs(s));
             }
         }
-        best[l] = std::max(best[l], std::fabs(x[j * W + l]));
+        best[l] = std::max(best[l], std::fabs(x(j, l)));
         threshold[l] = 0.7F * best[l];
     };
     // Only lanes whose largest magnitude reaches the threshold need a look at the frames:
@@ -234,20 +232,18 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
     // the previous call.
     std::array<float, W> largest = magnitude;
     for (std::size_t j = begin; j < kHistory; ++j) {
-        for (std::size_t l = 0; l < W; ++l)
-            largest[l] = std::max(largest[l], std::fabs(x[j * W + l]));
+        for (std::size_t l = 0; l < W; ++l) largest[l] = std::max(largest[l], std::fabs(x(j, l)));
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (!interpolate_[l] || largest[l] < threshold[l]) continue;
         for (std::size_t j = begin; j < end; ++j) {
-            if (std::fabs(x[j * W + l]) >= threshold[l]) interpolateAround(j, l);
+            if (std::fabs(x(j, l)) >= threshold[l]) interpolateAround(j, l);
         }
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (interpolate_[l]) truePeak_[l] = best[l];
     }
-    std::copy(extended_.begin() + static_cast<std::ptrdiff_t>((total - kHistory) * W),
-              extended_.begin() + static_cast<std::ptrdiff_t>(total * W), tail_.begin());
+    keepTail(frames, count);
     tailSettled_ = true;
 }
 
@@ -310,6 +306,12 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
         }
     }
     // The history for interpolation restarts with the fast path.
+    keepTail(frames, count);
+    tailSettled_ = false;
+}
+
+template <std::size_t W>
+void BandLevels<W>::keepTail(const float* frames, std::size_t count) {
     if (count >= kHistory) {
         std::copy(frames + (count - kHistory) * W, frames + count * W, tail_.begin());
     } else if (count > 0) {
@@ -317,7 +319,6 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
                   tail_.begin());
         std::copy(frames, frames + count * W, tail_.end() - static_cast<std::ptrdiff_t>(count * W));
     }
-    tailSettled_ = false;
 }
 
 template <std::size_t W>

@@ -83,6 +83,8 @@ private:
     // Interpolated peaks around the largest samples of settled frames.
     void refinePeaks(const float* frames, std::size_t count, const std::array<float, W>& magnitude);
     void tick();
+    // The last kHistory frames seen, for interpolation across calls.
+    void keepTail(const float* frames, std::size_t count);
 
     unsigned code_ = 0;
     double rate_ = 1.0;
@@ -117,11 +119,10 @@ private:
     std::array<bool, W> hasExtremes_{};
     std::array<float, W> truePeak_{};
     std::vector<LevelHistogram> histogram_;
-    // Last frames of the previous call (for interpolation across calls), and a work area.
+    // Last frames of the previous call (for interpolation across calls).
     static constexpr std::size_t kHistory = 8;
     std::array<float, kHistory * W> tail_{};
     bool tailSettled_ = false;
-    std::vector<float> extended_;
     std::uint64_t callCount_ = 0;
     std::array<double, W> callEnergy_{};
     std::vector<std::vector<Leq>> shortLeqs_;

@@ -1,6 +1,6 @@
 // Bodies of the kernels of kernels.h. kernels.cpp includes this file once per instruction
 // set, each time inside its own namespace and with ORV_KERNEL_TARGET set to that set's
-// function attributes; it includes no header of its own. Types V4d, V8f, V4f, V4i, V4l
+// function attributes; it includes no header of its own. Types V4d, V8f, V4f, V4l, V4i, V8i
 // (GCC vectors) come from kernels.cpp.
 //
 // Written with GCC vector types: each operation on eight floats or four doubles is one AVX
@@ -193,31 +193,98 @@ ORV_LANES_ENTRY(lanesD3, double, 3)
 ORV_LANES_ENTRY(lanesD4, double, 4)
 #undef ORV_LANES_ENTRY
 
+// (1 - z^-2)^Order of x (x[-8] .. x[-1] readable), in double, stored as T; eight outputs a
+// step.
+template <typename T, unsigned Order>
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void zerosRun(const float* x, std::size_t n,
+                                                              T* out) {
+    constexpr double kCoef[5][5] = {
+        {1, 0, 0, 0, 0}, {1, -1, 0, 0, 0}, {1, -2, 1, 0, 0}, {1, -3, 3, -1, 0}, {1, -4, 6, -4, 1}};
+    std::size_t i = 0;
+    for (; i + 4 <= n; i += 4) {
+        V4f v;
+        __builtin_memcpy(&v, x + i, sizeof v);
+        V4d acc = __builtin_convertvector(v, V4d);
+#pragma GCC unroll 4
+        for (unsigned j = 1; j <= Order; ++j) {
+            __builtin_memcpy(&v, x + i - 2 * j, sizeof v);
+            acc += kCoef[Order][j] * __builtin_convertvector(v, V4d);
+        }
+        if constexpr (sizeof(T) == sizeof(float)) {
+            const V4f f = __builtin_convertvector(acc, V4f);
+            __builtin_memcpy(out + i, &f, sizeof f);
+        } else {
+            __builtin_memcpy(out + i, &acc, sizeof acc);
+        }
+    }
+    for (; i < n; ++i) {
+        double acc = x[i];
+        for (unsigned j = 1; j <= Order; ++j)
+            acc += kCoef[Order][j] * static_cast<double>(x[i - 2 * j]);
+        out[i] = static_cast<T>(acc);
+    }
+}
+
+#define ORV_ZEROS_ENTRY(NAME, T, ORDER)                                  \
+    ORV_KERNEL_TARGET void NAME(const float* x, std::size_t n, T* out) { \
+        zerosRun<T, ORDER>(x, n, out);                                   \
+    }
+ORV_ZEROS_ENTRY(zerosF1, float, 1)
+ORV_ZEROS_ENTRY(zerosF2, float, 2)
+ORV_ZEROS_ENTRY(zerosF3, float, 3)
+ORV_ZEROS_ENTRY(zerosF4, float, 4)
+ORV_ZEROS_ENTRY(zerosD1, double, 1)
+ORV_ZEROS_ENTRY(zerosD2, double, 2)
+ORV_ZEROS_ENTRY(zerosD3, double, 3)
+ORV_ZEROS_ENTRY(zerosD4, double, 4)
+#undef ORV_ZEROS_ENTRY
+
+template <std::size_t H>
+struct MagnitudeVec;
+template <>
+struct MagnitudeVec<1> {
+    using V = V4f;
+    using Bits = V4i;
+};
+template <>
+struct MagnitudeVec<2> {
+    using V = V8f;
+    using Bits = V8i;
+};
+
 // Statistics of H four-lane halves (lanes 0 .. 4H-1 of frames eight floats apart): energy,
 // time weighting y = (1 - a) y + a p and its extremes, largest magnitude.
 template <std::size_t H>
 ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* frames, std::size_t run,
                                                                const LevelRun& r) {
+    using M = typename MagnitudeVec<H>::V;  // the lanes' floats
+    using Bits = typename MagnitudeVec<H>::Bits;
     V4d e[H], y[H], mx[H], mn[H];
-    V4f mag[H];
-#pragma GCC unroll 16
+    M mag;
     for (std::size_t h = 0; h < H; ++h) {
         __builtin_memcpy(&e[h], r.energy + 4 * h, sizeof(V4d));
         __builtin_memcpy(&y[h], r.tw + 4 * h, sizeof(V4d));
         __builtin_memcpy(&mx[h], r.maxima + 4 * h, sizeof(V4d));
         __builtin_memcpy(&mn[h], r.minima + 4 * h, sizeof(V4d));
-        __builtin_memcpy(&mag[h], r.magnitude + 4 * h, sizeof(V4f));
     }
+    __builtin_memcpy(&mag, r.magnitude, sizeof mag);
     const V4d a = r.alpha - V4d{};
     const V4d keep = (1.0 - r.alpha) - V4d{};
+    const Bits noSign = (Bits{} + 0x7fffffff);
     for (std::size_t k = 0; k < run; ++k) {
-#pragma GCC unroll 16
+        M v;
+        __builtin_memcpy(&v, frames + k * 8, sizeof v);
+        Bits bits;
+        __builtin_memcpy(&bits, &v, sizeof bits);
+        bits &= noSign;
+        M av;
+        __builtin_memcpy(&av, &bits, sizeof av);
+        mag = mag > av ? mag : av;
+#pragma GCC unroll 2
         for (std::size_t h = 0; h < H; ++h) {
-            V4f v;
-            __builtin_memcpy(&v, frames + k * 8 + 4 * h, sizeof v);
-            const V4f av = v < 0.0F ? -v : v;
-            mag[h] = mag[h] > av ? mag[h] : av;
-            const V4d d = __builtin_convertvector(v, V4d);
+            V4f part;
+            __builtin_memcpy(&part, frames + k * 8 + 4 * h, sizeof part);
+            const V4d d = __builtin_convertvector(part, V4d);
             const V4d p = d * d;
             e[h] += p;
             y[h] = keep * y[h] + a * p;
@@ -225,14 +292,13 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
             mn[h] = mn[h] < y[h] ? mn[h] : y[h];
         }
     }
-#pragma GCC unroll 16
     for (std::size_t h = 0; h < H; ++h) {
         __builtin_memcpy(r.energy + 4 * h, &e[h], sizeof(V4d));
         __builtin_memcpy(r.tw + 4 * h, &y[h], sizeof(V4d));
         __builtin_memcpy(r.maxima + 4 * h, &mx[h], sizeof(V4d));
         __builtin_memcpy(r.minima + 4 * h, &mn[h], sizeof(V4d));
-        __builtin_memcpy(r.magnitude + 4 * h, &mag[h], sizeof(V4f));
     }
+    __builtin_memcpy(r.magnitude, &mag, sizeof mag);
 }
 
 ORV_KERNEL_TARGET void levels8(const float* frames, std::size_t run, const LevelRun& r) {
@@ -248,6 +314,8 @@ const KernelTable kTable = {
     {decimate2, decimate4, decimate6, decimate8},
     {lanesF1, lanesF2, lanesF3, lanesF4},
     {lanesD1, lanesD2, lanesD3, lanesD4},
+    {zerosF1, zerosF2, zerosF3, zerosF4},
+    {zerosD1, zerosD2, zerosD3, zerosD4},
     levels8,
     levels4,
 };

@@ -8,8 +8,9 @@ namespace {
 typedef double V4d __attribute__((vector_size(32)));
 typedef float V8f __attribute__((vector_size(32)));
 typedef float V4f __attribute__((vector_size(16)));
-typedef int V4i __attribute__((vector_size(16)));
 typedef long long V4l __attribute__((vector_size(32)));
+typedef int V4i __attribute__((vector_size(16)));
+typedef int V8i __attribute__((vector_size(32)));
 
 namespace generic {
 constexpr const char* kTableName = "generic";

@@ -9,8 +9,8 @@
 // - iir / iirDecimate: one signal through a cascade of up to four second-order sections,
 //   eight samples at a time as a state-space step (state of the sections' transposed
 //   direct form II, see sos.h), every output or every second one;
-// - lanes: up to eight band filters side by side, all-pole sections behind an input that
-//   already holds their zeros (see sos.h), float or double;
+// - zeros and lanes: up to eight band filters side by side, all-pole sections behind an
+//   input that already holds their zeros (see sos.h), float or double;
 // - levels: squares, energy, exponential time weighting and its extremes, and the largest
 //   magnitude of up to eight lanes (see band_levels.h).
 #pragma once
@@ -56,6 +56,9 @@ struct KernelTable {
                       const float* coef, const float* gain, const float* pick, float* state);
     void (*lanesD[4])(const double* uLow, const double* uHigh, std::size_t n, float* out,
                       const double* coef, const double* gain, const double* pick, double* state);
+    // (1 - z^-2)^order of x (x[-8] .. x[-1] readable), n outputs; indexed by order - 1.
+    void (*zerosF[4])(const float* x, std::size_t n, float* out);
+    void (*zerosD[4])(const float* x, std::size_t n, double* out);
     // run frames of eight floats; levels4 looks at lanes 0..3 only.
     void (*levels8)(const float* frames, std::size_t run, const LevelRun& state);
     void (*levels4)(const float* frames, std::size_t run, const LevelRun& state);

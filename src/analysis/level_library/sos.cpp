@@ -121,23 +121,22 @@ std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* o
 
 template <typename T>
 void BandZeros::process(const float* in, std::size_t n, T* out) {
-    // Binomial coefficients of (1 - x)^order, order <= 4.
-    static constexpr double kCoef[5][5] = {
-        {1, 0, 0, 0, 0}, {1, -1, 0, 0, 0}, {1, -2, 1, 0, 0}, {1, -3, 3, -1, 0}, {1, -4, 6, -4, 1}};
-    const double* c = kCoef[std::min(order_, 4U)];
+    if (order_ == 0) {
+        std::copy(in, in + n, out);
+        return;
+    }
+    const KernelTable& k = kernels();
     for (std::size_t start = 0; start < n; start += kPiece) {
         const std::size_t m = std::min(kPiece, n - start);
         std::copy(in + start, in + start + m, padded_.begin() + 8);
-        const float* x = padded_.data() + 8;
-        for (std::size_t i = 0; i < m; ++i) {
-            double acc = x[i];
-            for (unsigned j = 1; j <= order_; ++j) acc += c[j] * static_cast<double>(x[i - 2 * j]);
-            out[start + i] = static_cast<T>(acc);
+        if constexpr (std::is_same_v<T, float>) {
+            k.zerosF[order_ - 1](padded_.data() + 8, m, out + start);
+        } else {
+            k.zerosD[order_ - 1](padded_.data() + 8, m, out + start);
         }
         // The last eight samples lead the next piece.
         std::copy(padded_.begin() + static_cast<std::ptrdiff_t>(m),
-                  padded_.begin() + static_cast<std::ptrdiff_t>(m + 8), history_.begin());
-        std::copy(history_.begin(), history_.end(), padded_.begin());
+                  padded_.begin() + static_cast<std::ptrdiff_t>(m + 8), padded_.begin());
     }
 }
 

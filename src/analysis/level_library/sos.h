@@ -55,12 +55,12 @@ private:
 
 // The zeros of a band-pass made by the bilinear transform, n at z = 1 and n at z = -1:
 // (1 - z^-2)^n, applied to a signal in double precision and kept for the band filters of
-// SosLanes. The last eight input samples are kept between calls.
+// SosLanes. Order 4 at most; the last eight input samples are kept between calls.
 class BandZeros {
 public:
     explicit BandZeros(unsigned order = 0) : order_(order) {}
     unsigned order() const { return order_; }
-    void reset() { history_.fill(0.0F); }
+    void reset() { padded_.fill(0.0F); }
     // out[i] for in[i], i < n; T is float or double.
     template <typename T>
     void process(const float* in, std::size_t n, T* out);
@@ -68,8 +68,7 @@ public:
 private:
     static constexpr std::size_t kPiece = 256;
     unsigned order_;
-    std::array<float, 8> history_{};
-    std::array<float, 8 + kPiece> padded_{};  // history + a piece of the input
+    std::array<float, 8 + kPiece> padded_{};  // the last eight samples, then a piece
 };
 
 // Up to kLaneWidth band-pass filters fed with the same signal, run side by side: each lane
