@@ -7,7 +7,9 @@
 // instruction, or two SSE instructions on the generic path.
 
 // No helper takes or returns a vector by value: without AVX that would change the calling
-// convention of the generic copy (GCC warns), so the selects and broadcasts are written out.
+// convention of the generic copy (GCC warns). Selects and broadcasts are the macros
+// ORV_SELECT(out, mask, a, b) and ORV_BROADCAST(v, k) of kernels.cpp, written for each
+// instruction set (a plain vector ?: would become scalar code on two-register vectors).
 
 // N: state size (2 per section); Decimate: keep the odd outputs only.
 template <std::size_t N, bool Decimate>
@@ -61,8 +63,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& 
         }
 #pragma GCC unroll 16
         for (std::size_t k = 0; k < N; ++k) {
-            const auto j = static_cast<long long>(k % 4);
-            const V4d sk = __builtin_shuffle(s[k / 4], V4l{j, j, j, j});
+            const V4d sk = ORV_BROADCAST(s[k / 4], k % 4);
 #pragma GCC unroll 16
             for (std::size_t h = 0; h < kHalves; ++h) {
                 V4d col;
@@ -93,10 +94,46 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& 
     if (kHalves == 2) __builtin_memcpy(state + 4, &s[1], sizeof(V4d));
 }
 
+// The same cascade sample by sample (transposed direct form II, the state of iirRun).
+template <std::size_t N, bool Decimate>
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirSerial(const IirBlockPlan& pl,
+                                                               double* state, const float* in,
+                                                               std::size_t blocks, float* out) {
+    constexpr std::size_t K = N / 2;
+    double c[K][5], s1[K], s2[K];
+#pragma GCC unroll 4
+    for (std::size_t k = 0; k < K; ++k) {
+        for (std::size_t j = 0; j < 5; ++j) c[k][j] = pl.sos[k][j];
+        s1[k] = state[2 * k];
+        s2[k] = state[2 * k + 1];
+    }
+    std::size_t written = 0;
+    for (std::size_t i = 0; i < blocks * 8; ++i) {
+        double x = in[i];
+#pragma GCC unroll 4
+        for (std::size_t k = 0; k < K; ++k) {
+            const double y = c[k][0] * x + s1[k];
+            s1[k] = (c[k][1] * x + s2[k]) - c[k][3] * y;
+            s2[k] = c[k][2] * x - c[k][4] * y;
+            x = y;
+        }
+        if (!Decimate || i % 2 == 1) out[written++] = static_cast<float>(x);
+    }
+#pragma GCC unroll 4
+    for (std::size_t k = 0; k < K; ++k) {
+        state[2 * k] = s1[k];
+        state[2 * k + 1] = s2[k];
+    }
+}
+
 #define ORV_IIR_ENTRY(NAME, N, DECIMATE)                                                \
     ORV_KERNEL_TARGET void NAME(const IirBlockPlan& pl, double* state, const float* in, \
                                 std::size_t blocks, float* out) {                       \
-        iirRun<N, DECIMATE>(pl, state, in, blocks, out);                                \
+        if constexpr (kIirBlocks) {                                                     \
+            iirRun<N, DECIMATE>(pl, state, in, blocks, out);                            \
+        } else {                                                                        \
+            iirSerial<N, DECIMATE>(pl, state, in, blocks, out);                         \
+        }                                                                               \
     }
 ORV_IIR_ENTRY(iir2, 2, false)
 ORV_IIR_ENTRY(iir4, 4, false)
@@ -149,7 +186,8 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
         const V hi = uHigh[i] - V{};
 #pragma GCC unroll 16
         for (std::size_t p = 0; p < P; ++p) {
-            V x = mixed ? (sel[p] != 0 ? hi : lo) : lo;
+            V x = lo;
+            if (mixed) ORV_SELECT(x, sel[p] != 0, hi, lo);
 #pragma GCC unroll 16
             for (std::size_t k = 0; k < K; ++k) {
                 // w[n-2] first: the recursion through w[n-1] is a single multiply-add.
@@ -279,7 +317,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
         bits &= noSign;
         M av;
         __builtin_memcpy(&av, &bits, sizeof av);
-        mag = mag > av ? mag : av;
+        ORV_MAX_F(mag, av);
 #pragma GCC unroll 2
         for (std::size_t h = 0; h < H; ++h) {
             V4f part;
@@ -288,8 +326,8 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
             const V4d p = d * d;
             e[h] += p;
             y[h] = keep * y[h] + a * p;
-            mx[h] = mx[h] > y[h] ? mx[h] : y[h];
-            mn[h] = mn[h] < y[h] ? mn[h] : y[h];
+            ORV_MAX_D(mx[h], y[h]);
+            ORV_MIN_D(mn[h], y[h]);
         }
     }
     for (std::size_t h = 0; h < H; ++h) {

@@ -8,7 +8,9 @@
 // Kernels:
 // - iir / iirDecimate: one signal through a cascade of up to four second-order sections,
 //   eight samples at a time as a state-space step (state of the sections' transposed
-//   direct form II, see sos.h), every output or every second one;
+//   direct form II, see sos.h), every output or every second one; the generic path runs
+//   the sections sample by sample instead (the step costs four times its vector work on
+//   two-double registers without fused multiply-add), with the same state;
 // - zeros and lanes: up to eight band filters side by side, all-pole sections behind an
 //   input that already holds their zeros (see sos.h), float or double;
 // - levels: squares, energy, exponential time weighting and its extremes, and the largest
@@ -29,6 +31,7 @@ struct IirBlockPlan {
     alignas(32) double q[kBlock][kMaxOrder];     // q[i]: column i (input i -> next state)
     alignas(32) double o[kMaxOrder][kBlock];     // o[k]: column k (state k -> outputs)
     alignas(32) double t[kBlock][kBlock];        // t[i]: column i (input i -> outputs)
+    double sos[4][5];  // the sections (b0 b1 b2 a1 a2), for kernels that run them directly
 };
 
 // Running state of up to eight lanes of statistics (band_levels.h), in and out of a kernel.

@@ -28,6 +28,11 @@ double step(const SosList& sos, double* state, double x) {
 // from rest, to a unit input sample.
 IirBlockPlan makePlan(const SosList& sos) {
     IirBlockPlan plan{};
+    for (std::size_t k = 0; k < sos.size(); ++k) {
+        const Sos& c = sos[k];
+        const double row[5] = {c.b0, c.b1, c.b2, c.a1, c.a2};
+        std::copy(row, row + 5, plan.sos[k]);
+    }
     const std::size_t order = 2 * sos.size();
     for (std::size_t k = 0; k < order; ++k) {
         double state[IirBlockPlan::kMaxOrder] = {};
