@@ -24,9 +24,11 @@ double step(const SosList& sos, double* state, double x) {
     return x;
 }
 
+}  // namespace
+
 // The block matrices, column by column: the response over one block to a unit state and,
 // from rest, to a unit input sample.
-IirBlockPlan makePlan(const SosList& sos) {
+IirBlockPlan makeIirBlockPlan(const SosList& sos) {
     IirBlockPlan plan{};
     for (std::size_t k = 0; k < sos.size(); ++k) {
         const Sos& c = sos[k];
@@ -49,11 +51,9 @@ IirBlockPlan makePlan(const SosList& sos) {
     return plan;
 }
 
-}  // namespace
-
 SosCascade::SosCascade(const SosList& sos) : sections_(sos.size()) {
     if (sos.size() > 4) throw std::invalid_argument("a cascade has at most four sections");
-    if (!sos.empty()) plan_ = std::make_shared<const IirBlockPlan>(makePlan(sos));
+    if (!sos.empty()) plan_ = std::make_shared<const IirBlockPlan>(makeIirBlockPlan(sos));
 }
 
 void SosCascade::reset() {

@@ -15,6 +15,9 @@
 
 namespace SlmLibrary {
 
+// The block matrices of a cascade of up to four sections (kernels.h).
+IirBlockPlan makeIirBlockPlan(const SosList& sos);
+
 // One signal through a cascade of up to four sections, double precision (used where poles
 // sit close to z = 1 at the full rate: frequency weighting, filtered channel, anti-alias
 // filters). The cascade runs in blocks of eight samples counted from reset: each block is
