@@ -124,6 +124,10 @@ std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* o
     return run<true>(in, n, out);
 }
 
+BandZeros::BandZeros(unsigned order) : order_(order) {
+    if (order > 4) throw std::invalid_argument("band zeros of order 4 at most");
+}
+
 template <typename T>
 void BandZeros::process(const float* in, std::size_t n, T* out) {
     if (order_ == 0) {

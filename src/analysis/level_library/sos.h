@@ -61,7 +61,8 @@ private:
 // SosLanes. Order 4 at most; the last eight input samples are kept between calls.
 class BandZeros {
 public:
-    explicit BandZeros(unsigned order = 0) : order_(order) {}
+    // Throws std::invalid_argument for an order above 4.
+    explicit BandZeros(unsigned order = 0);
     unsigned order() const { return order_; }
     void reset() { padded_.fill(0.0F); }
     // out[i] for in[i], i < n; T is float or double.
