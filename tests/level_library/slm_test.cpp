@@ -323,14 +323,28 @@ TEST(MeterStartUp, ASteadyToneReadsSteadyFromTheFirstBlockInEveryOctaveBand) {
     checkSettlingWithoutPreRoll(false, TWeight::F);
 }
 
-// Stationary noise: minute 2 analysed as a block of its own with 2 s of pre-roll reads as
-// minute 2 of one continuous analysis.
-void checkBlockAgainstContinuous(unsigned tw, double preRollSeconds) {
+// Audio from minute 2 on, analysed as a block of its own with pre-roll, reads as the same
+// stretch of one continuous analysis. Stationary noise over a minute, or (swings) 10 s of
+// pink noise whose level jumps at random within +-15 dB every quarter second, loudest in the
+// block's first half second: the pre-roll differs from the audio before it, and a warm-up
+// that outlasts the pre-roll (2.6 s for 6.3 Hz) would leave a share of the short block out of
+// its statistics (Z weighting keeps the lowest bands loud).
+void checkBlockAgainstContinuous(unsigned tw, double preRollSeconds, bool swings = false) {
     const std::size_t minute = 60 * 48000;
     std::vector<float> x = level_library_test::pinkNoise(2 * minute, 4242);
-    for (float& v : x) v *= 1000.0F;
+    std::uint32_t seed = 99;
+    float gain = 1000.0F;
+    for (std::size_t i = 0; i < x.size(); ++i) {
+        if (swings && i % 12000 == 0) {
+            seed = seed * 1664525U + 1013904223U;
+            const double jump =
+                i - minute < 24000 ? 1.0 : static_cast<double>(seed >> 8) / 16777216.0;
+            gain = static_cast<float>(1000.0 * std::pow(10.0, 1.5 * jump - 0.75));
+        }
+        x[i] *= gain;
+    }
     auto setUp = [&](Slm& slm) {
-        slm.initThirdOct(tw, FWeight::A, 0, 35, kFs, 0);
+        slm.initThirdOct(tw, swings ? FWeight::Z : FWeight::A, 0, 35, kFs, 0);
         slm.setPercentiles({10.0F, 50.0F, 90.0F});
         slm.resetAll();
     };
@@ -338,13 +352,14 @@ void checkBlockAgainstContinuous(unsigned tw, double preRollSeconds) {
     setUp(continuous);
     feed(continuous, x.data(), minute);
     continuous.resetStatistics();
-    feed(continuous, x.data() + minute, minute);
+    const std::size_t length = swings ? minute / 6 : minute;
+    feed(continuous, x.data() + minute, length);
 
     Slm block(kFs, 1, 48000);
     setUp(block);
     const auto preRoll = static_cast<std::size_t>(preRollSeconds * kFs);
     block.preRoll(x.data() + minute - preRoll, preRoll);
-    feed(block, x.data() + minute, minute);
+    feed(block, x.data() + minute, length);
 
     for (unsigned b = 0; b < kThirdOctaveBandCount; ++b) {
         const level_library_test::Reading c = readBand(continuous, b);
@@ -364,6 +379,12 @@ TEST(MeterStartUp, BlocksWithPreRollReadAsOneContinuousAnalysisF) {
 TEST(MeterStartUp, BlocksWithPreRollReadAsOneContinuousAnalysisS) {
     // The S average remembers more: the lowest bands need about 8 s of history.
     checkBlockAgainstContinuous(TWeight::S, 8.0);
+}
+
+TEST(MeterStartUp, BlocksWithPreRollReadAsOneContinuousAnalysisOfSwingingNoise) {
+    checkBlockAgainstContinuous(TWeight::F, 3.0, true);
+    checkBlockAgainstContinuous(TWeight::N, 3.0, true);
+    checkBlockAgainstContinuous(TWeight::S, 8.0, true);
 }
 
 }  // namespace

@@ -7,57 +7,11 @@
 #include <numbers>
 
 #include "dsp.h"
-#include "kernel_clones.h"
+#include "kernels.h"
 #include "tweight.h"
 
 namespace SlmLibrary {
 namespace {
-
-// Settled statistics of eight lanes over `run` frames: energy, peak, exponential time
-// weighting and its extremes; `magnitude` collects the largest magnitude of the call. The
-// time weighting is y = (1 - a) y + a p, one fused multiply-add per frame in the x86-64-v3
-// clone. Written as fixed-width loops over the lanes, which the compiler turns into vector
-// operations of either width (explicit 8-wide selects would be split into scalar code
-// without AVX).
-ORV_KERNEL_CLONES ORV_KERNEL_CONTRACT void settledRun8(
-    const float* __restrict frames, std::size_t run, double a, double* __restrict energy,
-    double* __restrict tw, double* __restrict maxima, double* __restrict minima,
-    float* __restrict peak, float* __restrict magnitude) {
-    constexpr std::size_t L = 8;
-    double e[L], y[L], mx[L], mn[L];
-    float pk[L], mag[L];
-    for (std::size_t l = 0; l < L; ++l) {
-        e[l] = energy[l];
-        y[l] = tw[l];
-        mx[l] = maxima[l];
-        mn[l] = minima[l];
-        pk[l] = peak[l];
-        mag[l] = magnitude[l];
-    }
-    const double keep = 1.0 - a;
-    for (std::size_t k = 0; k < run; ++k) {
-        for (std::size_t l = 0; l < L; ++l) {
-            const float v = frames[k * L + l];
-            const float av = v < 0.0F ? -v : v;
-            pk[l] = pk[l] > av ? pk[l] : av;
-            mag[l] = mag[l] > av ? mag[l] : av;
-            const double d = v;
-            const double p = d * d;
-            e[l] += p;
-            y[l] = keep * y[l] + a * p;
-            mx[l] = mx[l] > y[l] ? mx[l] : y[l];
-            mn[l] = mn[l] < y[l] ? mn[l] : y[l];
-        }
-    }
-    for (std::size_t l = 0; l < L; ++l) {
-        energy[l] = e[l];
-        tw[l] = y[l];
-        maxima[l] = mx[l];
-        minima[l] = mn[l];
-        peak[l] = pk[l];
-        magnitude[l] = mag[l];
-    }
-}
 
 // Lanczos (a = 4) interpolation at quarter-sample offsets t = 0.25, 0.5, 0.75 from the
 // sample at tap 3 of eight consecutive samples; each kernel sums to one.
@@ -99,7 +53,9 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
     tickSamples_ = static_cast<std::size_t>(std::lround(0.01 * inputRate / factor));
     periodSamples_ = static_cast<std::size_t>(std::lround(0.1 * inputRate / factor));
     if (code_ != TWeight::N) alpha_ = -std::expm1(-1.0 / (TWeight::timeConstant(code_) * rate));
+    lowHalfOnly_ = true;
     for (std::size_t l = 0; l < W; ++l) {
+        if (l >= 4 && lanes[l].active) lowHalfOnly_ = false;
         active_[l] = lanes[l].active;
         interpolate_[l] = lanes[l].active && lanes[l].interpolatePeak;
         anyInterpolated_ = anyInterpolated_ || interpolate_[l];
@@ -200,56 +156,58 @@ void BandLevels<W>::finishPriming(std::size_t l) {
 
 template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
-    const double a = alpha_;
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
+    const LevelRun run{energy_.data(), tw_.data(),       max_.data(),
+                       min_.data(),    magnitude.data(), alpha_};
+    // Groups whose lanes 4..7 are unused need half the work.
+    auto* const kernel =
+        kernels().levels4 == nullptr || !lowHalfOnly_ ? kernels().levels8 : kernels().levels4;
     std::size_t i = 0;
     while (i < count) {
-        const std::size_t run = std::min(count - i, tickSamples_ - tickPhase_);
+        const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);
         const float* f = frames + i * W;
         if constexpr (W == 8) {
-            settledRun8(f, run, a, energy_.data(), tw_.data(), max_.data(), min_.data(),
-                        peak_.data(), magnitude.data());
+            kernel(f, n, run);
         } else {
-            for (std::size_t k = 0; k < run; ++k) {
+            const double a = alpha_;
+            for (std::size_t k = 0; k < n; ++k) {
                 for (std::size_t l = 0; l < W; ++l) {
                     const float v = f[k * W + l];
                     const double p = static_cast<double>(v) * static_cast<double>(v);
                     energy_[l] += p;
-                    peak_[l] = std::max(peak_[l], std::fabs(v));
                     magnitude[l] = std::max(magnitude[l], std::fabs(v));
-                    tw_[l] += a * (p - tw_[l]);
+                    tw_[l] = (1.0 - a) * tw_[l] + a * p;
                     max_[l] = std::max(max_[l], tw_[l]);
                     min_[l] = std::min(min_[l], tw_[l]);
                 }
             }
         }
         for (std::size_t l = 0; l < W; ++l) hasExtremes_[l] = hasExtremes_[l] || active_[l];
-        seen_ += run;
-        count_ += run;
-        i += run;
-        tickPhase_ += run;
+        seen_ += n;
+        count_ += n;
+        i += n;
+        tickPhase_ += n;
         if (tickPhase_ == tickSamples_) {
             tickPhase_ = 0;
             tick();
         }
     }
+    for (std::size_t l = 0; l < W; ++l) peak_[l] = std::max(peak_[l], magnitude[l]);
     if (anyInterpolated_) refinePeaks(frames, count, magnitude);
 }
 
 template <std::size_t W>
 void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
                                 const std::array<float, W>& magnitude) {
-    // Frames -8 .. -1 from the previous call, then this call's. A sample is interpolated
-    // once four frames after it are known; the last four wait for the next call.
+    // Frames -8 .. -1 from the previous call (tail_), then this call's. A sample is
+    // interpolated once four frames after it are known; the last four wait for the next call.
     const std::size_t total = kHistory + count;
-    if (extended_.size() < total * W) extended_.resize(total * W);
-    std::copy(tail_.begin(), tail_.end(), extended_.begin());
-    std::copy(frames, frames + count * W,
-              extended_.begin() + static_cast<std::ptrdiff_t>(kHistory * W));
     const std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
     const std::size_t end = total - 4;
     const QuarterKernels& k = quarterKernels();
-    const float* x = extended_.data();
+    auto x = [&](std::size_t j, std::size_t l) {
+        return j < kHistory ? tail_[j * W + l] : frames[(j - kHistory) * W + l];
+    };
     // The crest is within half a sample of a sample at least cos(pi / 4) of it for content
     // below a quarter of the rate: samples under 0.7 of the running peak need no look.
     std::array<float, W> best{};
@@ -262,11 +220,11 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
         for (std::size_t base = j - 1; base <= j; ++base) {
             for (int t = 0; t < 3; ++t) {
                 float s = 0.0F;
-                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x[(base - 3 + i) * W + l];
+                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x(base - 3 + i, l);
                 best[l] = std::max(best[l], std::fabs(s));
             }
         }
-        best[l] = std::max(best[l], std::fabs(x[j * W + l]));
+        best[l] = std::max(best[l], std::fabs(x(j, l)));
         threshold[l] = 0.7F * best[l];
     };
     // Only lanes whose largest magnitude reaches the threshold need a look at the frames:
@@ -274,20 +232,18 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
     // the previous call.
     std::array<float, W> largest = magnitude;
     for (std::size_t j = begin; j < kHistory; ++j) {
-        for (std::size_t l = 0; l < W; ++l)
-            largest[l] = std::max(largest[l], std::fabs(x[j * W + l]));
+        for (std::size_t l = 0; l < W; ++l) largest[l] = std::max(largest[l], std::fabs(x(j, l)));
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (!interpolate_[l] || largest[l] < threshold[l]) continue;
         for (std::size_t j = begin; j < end; ++j) {
-            if (std::fabs(x[j * W + l]) >= threshold[l]) interpolateAround(j, l);
+            if (std::fabs(x(j, l)) >= threshold[l]) interpolateAround(j, l);
         }
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (interpolate_[l]) truePeak_[l] = best[l];
     }
-    std::copy(extended_.begin() + static_cast<std::ptrdiff_t>((total - kHistory) * W),
-              extended_.begin() + static_cast<std::ptrdiff_t>(total * W), tail_.begin());
+    keepTail(frames, count);
     tailSettled_ = true;
 }
 
@@ -350,6 +306,12 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
         }
     }
     // The history for interpolation restarts with the fast path.
+    keepTail(frames, count);
+    tailSettled_ = false;
+}
+
+template <std::size_t W>
+void BandLevels<W>::keepTail(const float* frames, std::size_t count) {
     if (count >= kHistory) {
         std::copy(frames + (count - kHistory) * W, frames + count * W, tail_.begin());
     } else if (count > 0) {
@@ -357,7 +319,6 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
                   tail_.begin());
         std::copy(frames, frames + count * W, tail_.end() - static_cast<std::ptrdiff_t>(count * W));
     }
-    tailSettled_ = false;
 }
 
 template <std::size_t W>

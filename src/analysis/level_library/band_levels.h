@@ -83,6 +83,8 @@ private:
     // Interpolated peaks around the largest samples of settled frames.
     void refinePeaks(const float* frames, std::size_t count, const std::array<float, W>& magnitude);
     void tick();
+    // The last kHistory frames seen, for interpolation across calls.
+    void keepTail(const float* frames, std::size_t count);
 
     unsigned code_ = 0;
     double rate_ = 1.0;
@@ -92,6 +94,7 @@ private:
     std::array<bool, W> active_{};
     std::array<bool, W> interpolate_{};
     bool anyInterpolated_ = false;
+    bool lowHalfOnly_ = false;                  // lanes 4.. unused
     std::array<std::uint64_t, W> settleEnd_{};  // first sample after filter settling
     std::array<std::uint64_t, W> primeEnd_{};   // earliest first settled sample
 
@@ -116,11 +119,10 @@ private:
     std::array<bool, W> hasExtremes_{};
     std::array<float, W> truePeak_{};
     std::vector<LevelHistogram> histogram_;
-    // Last frames of the previous call (for interpolation across calls), and a work area.
+    // Last frames of the previous call (for interpolation across calls).
     static constexpr std::size_t kHistory = 8;
     std::array<float, kHistory * W> tail_{};
     bool tailSettled_ = false;
-    std::vector<float> extended_;
     std::uint64_t callCount_ = 0;
     std::array<double, W> callEnergy_{};
     std::vector<std::vector<Leq>> shortLeqs_;

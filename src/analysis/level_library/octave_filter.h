@@ -105,11 +105,20 @@ private:
     struct Design;
     static const Design& design(Bank bank);
 
+    // The zeros of a stage's bands (BandZeros of the orders its lanes read) and their
+    // outputs for one chunk.
+    struct StageZeros {
+        BandZeros low, high;
+        std::vector<float> lowF, highF;
+        std::vector<double> lowD, highD;
+    };
+
     Bank bank_;
     const Design* design_;
     std::vector<SosCascade> antiAlias_;     // one per stage transition
     std::vector<SosLanes<float>> lanesF_;   // per group (float stages)
     std::vector<SosLanes<double>> lanesD_;  // per group (double stage)
+    std::vector<StageZeros> zeros_;         // per stage
     std::vector<std::vector<float>> stageBuffers_;
     std::vector<float> frames_;
 };

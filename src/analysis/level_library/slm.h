@@ -56,9 +56,10 @@
 // into the statistics or short Leqs; when it is longer than the warm-up, the time weighting
 // is primed over all of it. A band whose warm-up fits in the pre-roll starts its statistics
 // at the block's first sample. How much pre-roll makes a block read as the same stretch of
-// one continuous analysis (within 0.2 dB for Leq, Lmax, Lmin and Ln in every band,
-// stationary noise, tested): F: 2 s (the 6.3 Hz third-octave band finishes its warm-up
-// 0.6 s into the block; N, which has no averaging memory, needs no more); S: 8 s, because the S
+// one continuous analysis (within 0.2 dB for Leq, Lmax, Lmin and Ln in every band, stationary
+// and fluctuating noise, tested): F and N: 3 s, longer than the longest warm-up (2.6 s,
+// 6.3 Hz third octave; with 2 s that band would start 0.6 s into the block, and on a short
+// block of fluctuating noise its Ln would be off by up to 0.8 dB); S: 8 s, because the S
 // average still carries 13 % of the audio older than 2 s; with 2 s of pre-roll the S levels of
 // bands below about 30 Hz may differ by up to 0.7 dB during the first seconds of the block.
 #pragma once

@@ -1,44 +1,86 @@
-// Processing states of second-order-section cascades (transposed direct form II).
+// Processing states of second-order-section cascades.
 //
 // The coefficients come from filter_design.h; the states here hold nothing else, so every
-// channel owns its own small copy and nothing mutable is shared between meters.
+// channel owns its own small copy and nothing mutable is shared between meters. The loops
+// themselves are in kernels.h.
 #pragma once
 
 #include <array>
 #include <cstddef>
+#include <memory>
 #include <vector>
 
 #include "filter_design.h"
+#include "kernels.h"
 
 namespace SlmLibrary {
 
-// One signal through a cascade, double precision state (used where poles sit close to
-// z = 1 at the full rate: frequency weighting, filtered channel, anti-alias filters).
+// The block matrices of a cascade of up to four sections (kernels.h).
+IirBlockPlan makeIirBlockPlan(const SosList& sos);
+
+// One signal through a cascade of up to four sections, double precision (used where poles
+// sit close to z = 1 at the full rate: frequency weighting, filtered channel, anti-alias
+// filters). The cascade runs in blocks of eight samples counted from reset: each block is
+// one state-space step (the state of the sections' transposed direct form II at the block
+// start, times fixed matrices, plus the block's inputs times fixed matrices, computed once
+// from the sections), which turns a chain of dependent multiply-adds per sample into
+// independent vector operations. The outputs of a block that a call leaves unfinished come
+// from the same step with its missing inputs zero (they do not reach earlier outputs), and
+// the block is finished by the next call: results do not depend on how the signal is cut
+// into calls.
 class SosCascade {
 public:
     SosCascade() = default;
+    // Throws std::invalid_argument for more than four sections.
     explicit SosCascade(const SosList& sos);
 
     void reset();
     // in and out may be the same array.
     void process(const float* in, float* out, std::size_t n);
-    double processSample(double x);
     // Filters n samples and keeps every second output (the odd ones, counting from the
     // first sample since reset), so that output k ends at input 2k+1. Returns the number
-    // of outputs written.
+    // of outputs written. in and out may be the same array.
     std::size_t processDecimate(const float* in, std::size_t n, float* out);
 
-    std::size_t sections() const { return coeffs_.size(); }
+    std::size_t sections() const { return sections_; }
 
 private:
-    std::vector<Sos> coeffs_;
-    std::vector<std::array<double, 2>> state_;  // s1, s2 per section
-    bool odd_ = false;                          // decimation phase
+    template <bool Decimate>
+    std::size_t run(const float* in, std::size_t n, float* out);
+
+    std::size_t sections_ = 0;
+    std::shared_ptr<const IirBlockPlan> plan_;  // read-only, shared by copies
+    alignas(32) std::array<double, IirBlockPlan::kMaxOrder> state_{};  // at the block start
+    std::array<float, IirBlockPlan::kBlock> pending_{};  // inputs of the unfinished block
+    std::size_t pendingCount_ = 0;
+    bool odd_ = false;  // decimation phase (no sections)
 };
 
-// Up to kLaneWidth band filters fed with the same input, run side by side: each lane is one
-// band, every lane has the same number of sections (unused ones are pass-through), so the
-// per-sample work is a few vector operations across lanes.
+// The zeros of a band-pass made by the bilinear transform, n at z = 1 and n at z = -1:
+// (1 - z^-2)^n, applied to a signal in double precision and kept for the band filters of
+// SosLanes. Order 4 at most; the last eight input samples are kept between calls.
+class BandZeros {
+public:
+    // Throws std::invalid_argument for an order above 4.
+    explicit BandZeros(unsigned order = 0);
+    unsigned order() const { return order_; }
+    void reset() { padded_.fill(0.0F); }
+    // out[i] for in[i], i < n; T is float or double.
+    template <typename T>
+    void process(const float* in, std::size_t n, T* out);
+
+private:
+    static constexpr std::size_t kPiece = 256;
+    unsigned order_;
+    std::array<float, 8 + kPiece> padded_{};  // the last eight samples, then a piece
+};
+
+// Up to kLaneWidth band-pass filters fed with the same signal, run side by side: each lane
+// is one band. A band-pass of n sections has the zeros (1 - z^-2)^n, which BandZeros applies
+// once for every lane: the lanes then run all-pole sections (two multiply-adds per section
+// and sample, one of them on the recursion) and their gain. Lanes with fewer sections than
+// others get pass-through sections; lanes may need two different zero orders (`low` and
+// `high`, each lane picks one).
 inline constexpr std::size_t kLaneWidth = 8;
 
 template <typename T>
@@ -47,20 +89,28 @@ public:
     static constexpr std::size_t kMaxSections = 4;
 
     SosLanes() = default;
-    // sos[l] is the cascade of lane l (empty for an unused lane); at most kMaxSections
-    // sections per lane.
+    // sos[l] is the cascade of lane l (empty for an unused lane, which reads 0); at most
+    // kMaxSections sections per lane, each lane's numerator a multiple of (1 - z^-2)^n with
+    // n its number of sections (throws std::invalid_argument otherwise).
     explicit SosLanes(const std::vector<SosList>& sos);
 
     void reset();
-    // out receives n frames of kLaneWidth floats (lane-interleaved).
-    void process(const float* in, std::size_t n, float* out);
+    // Zero orders the lanes read (equal when every lane reads the same).
+    unsigned lowOrder() const { return low_; }
+    unsigned highOrder() const { return high_; }
+    // uLow / uHigh: the band signal through BandZeros of lowOrder / highOrder; out receives
+    // n frames of kLaneWidth floats (lane-interleaved).
+    void process(const T* uLow, const T* uHigh, std::size_t n, float* out);
     std::size_t sections() const { return sections_; }
 
 private:
     std::size_t sections_ = 0;
-    std::vector<T> coef_;  // [section][b0 b1 b2 a1 a2][lane]
-    std::vector<T> s1_;    // [section][lane]
-    std::vector<T> s2_;
+    unsigned low_ = 0;
+    unsigned high_ = 0;
+    std::vector<T> coef_;   // [section][a1 a2][lane]
+    std::vector<T> gain_;   // [lane]
+    std::vector<T> pick_;   // [lane]: 1 where the lane reads the high order
+    std::vector<T> state_;  // [section][w1 w2][lane]
 };
 
 extern template class SosLanes<float>;

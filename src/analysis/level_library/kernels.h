@@ -1,0 +1,76 @@
+// The hot loops of the level library, compiled twice: for the baseline x86-64 instruction
+// set (the generic code path, also every other processor) and for AVX2 with fused
+// multiply-add. The processor is asked once, at first use, which one it runs; the choice is
+// a table of function pointers that never changes afterwards, so meters on different
+// threads share nothing mutable. Building with -DORV_GENERIC_KERNELS keeps the generic table
+// on every processor (to measure or test that path).
+//
+// Kernels:
+// - iir / iirDecimate: one signal through a cascade of up to four second-order sections,
+//   eight samples at a time as a state-space step (state of the sections' transposed
+//   direct form II, see sos.h), every output or every second one; the generic path runs
+//   the sections sample by sample instead (the step costs four times its vector work on
+//   two-double registers without fused multiply-add), with the same state;
+// - zeros and lanes: up to eight band filters side by side, all-pole sections behind an
+//   input that already holds their zeros (see sos.h), float or double;
+// - levels: squares, energy, exponential time weighting and its extremes, and the largest
+//   magnitude of up to eight lanes (see band_levels.h).
+#pragma once
+
+#include <cstddef>
+
+namespace SlmLibrary {
+
+// Eight-sample state-space step of a cascade of up to four sections (state size 2K <= 8),
+// all arrays column by column, padded with zeros: next state = p s + q u, outputs
+// y = o s + t u, for the state s at the start of the block and its inputs u.
+struct IirBlockPlan {
+    static constexpr std::size_t kBlock = 8;
+    static constexpr std::size_t kMaxOrder = 8;
+    alignas(32) double p[kMaxOrder][kMaxOrder];  // p[k]: column k (state k -> next state)
+    alignas(32) double q[kBlock][kMaxOrder];     // q[i]: column i (input i -> next state)
+    alignas(32) double o[kMaxOrder][kBlock];     // o[k]: column k (state k -> outputs)
+    alignas(32) double t[kBlock][kBlock];        // t[i]: column i (input i -> outputs)
+    double sos[4][5];  // the sections (b0 b1 b2 a1 a2), for kernels that run them directly
+};
+
+// Running state of up to eight lanes of statistics (band_levels.h), in and out of a kernel.
+struct LevelRun {
+    double* energy;
+    double* tw;
+    double* maxima;
+    double* minima;
+    float* magnitude;
+    double alpha;
+};
+
+struct KernelTable {
+    const char* name;
+    // `blocks` blocks of eight samples: out receives 8 per block (iir) or the odd samples,
+    // 4 per block (iirDecimate). in and out may be the same array. Indexed by order / 2 - 1.
+    void (*iir[4])(const IirBlockPlan& plan, double* state, const float* in, std::size_t blocks,
+                   float* out);
+    void (*iirDecimate[4])(const IirBlockPlan& plan, double* state, const float* in,
+                           std::size_t blocks, float* out);
+    // n frames of eight lanes: lane l reads uLow or, where pick[l] != 0, uHigh; then the
+    // all-pole sections (coef: per section a1[8], a2[8]; state: per section w1[8], w2[8]) and
+    // the gain (gain[8]). Indexed by the number of sections - 1.
+    void (*lanesF[4])(const float* uLow, const float* uHigh, std::size_t n, float* out,
+                      const float* coef, const float* gain, const float* pick, float* state);
+    void (*lanesD[4])(const double* uLow, const double* uHigh, std::size_t n, float* out,
+                      const double* coef, const double* gain, const double* pick, double* state);
+    // (1 - z^-2)^order of x (x[-8] .. x[-1] readable), n outputs; indexed by order - 1.
+    void (*zerosF[4])(const float* x, std::size_t n, float* out);
+    void (*zerosD[4])(const float* x, std::size_t n, double* out);
+    // run frames of eight floats; levels4 looks at lanes 0..3 only.
+    void (*levels8)(const float* frames, std::size_t run, const LevelRun& state);
+    void (*levels4)(const float* frames, std::size_t run, const LevelRun& state);
+};
+
+// The generic table, the AVX2 table (null where this processor or build has none), and the
+// one in use.
+const KernelTable& genericKernels();
+const KernelTable* avx2Kernels();
+const KernelTable& kernels();
+
+}  // namespace SlmLibrary
