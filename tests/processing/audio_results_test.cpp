@@ -102,6 +102,7 @@ TEST_F(AudioRun, TonesAndABurstReadTheirLevelsInTheirBands) {
         ASSERT_EQ(hpf[k].size(), 17U);
         EXPECT_EQ(hpf[k][1], "08:0" + std::to_string(k + 1));
         EXPECT_NEAR(num(hpf[k][2]), expected2k + c2k, 0.3) << k;
+        EXPECT_NEAR(num(hpf[k][3]), (k == 1 ? loud : steady) + c2k, 0.3) << k;
         if (k != 1) {
             EXPECT_NEAR(num(hpf[k][13]), steady + c2k + 3.01, 0.2) << k;
         }
