@@ -337,16 +337,30 @@ SessionReport analyseSession(const SessionFiles& s, const Thresholds& th,
     SessionSpan span;
     const bool useLeq = leqFile && !leqFile->leq.ends.empty();
     const bool haveGeneral = general && !general->stats.empty();
-    if (!useLeq && !haveGeneral) {
-        if (s.raw.empty()) r.quality.flags.push_back("no data");
+    // The span of the session: as its header states, widened to every row of its files.
+    std::optional<Seconds> first, last;
+    const auto seen = [&](Seconds from, Seconds to) {
+        first = std::min(first.value_or(from), from), last = std::max(last.value_or(to), to);
+    };
+    for (const ResultFile* f : {general, s.filtered ? &*s.filtered : nullptr})
+        if (f && !f->stats.empty()) seen(f->stats.front().end, f->stats.back().end);
+    for (const ResultFile& f : s.bands)
+        if (!f.stats.empty()) seen(f.stats.front().end, f.stats.back().end);
+    for (const auto* parts : {&s.leq, &s.octaveLeq})
+        if (!parts->empty() && !parts->front().leq.ends.empty())
+            seen(parts->front().leq.ends.front(), parts->front().leq.ends.back());
+    for (const ResultFile& f : s.raw)
+        if (f.raw.records) seen(f.raw.hourStart + kHour, f.raw.hourStart + kHour);
+    r.empty = !first;
+    if (r.empty) {
+        r.quality.flags.push_back("no data");
         r.history.y = levelAxis(1, -1, 10);
         if (head && head->start && head->end) r.history.x = timeAxis(*head->start, *head->end);
-        if (s.raw.empty()) return r;
+        return r;
     }
-    const Seconds firstEnd = useLeq        ? leqFile->leq.ends.front()
-                             : haveGeneral ? general->stats.front().end
-                                           : 0;
-    span.start = head && head->start ? *head->start : firstEnd - finestLength;
+    span.start =
+        head && head->start && *first > *head->start ? *head->start : *first - finestLength;
+    span.end = std::max(head && head->end ? *head->end : *last, *last);
     if (useLeq) {
         finestLength = std::max<Seconds>(1, leqFile->header.leqSeconds);
         r.history.source = "short Leq (" + std::to_string(finestLength) + " s)";
@@ -358,13 +372,7 @@ SessionReport analyseSession(const SessionFiles& s, const Thresholds& th,
         r.history.source = "interval Leq (" + std::to_string(generalLength / 60) + " min)";
         finest = statPieces(general->stats, generalLength, span.start, &StatRow::leq);
     }
-    r.empty = finest.empty();
-    if (!finest.empty()) {
-        span.start = std::min(span.start, finest.front().from);
-        span.end = std::max(head && head->end ? *head->end : finest.back().to, finest.back().to);
-    } else {
-        span.end = head && head->end ? *head->end : span.start;
-    }
+    if (!finest.empty()) span.start = std::min(span.start, finest.front().from);
 
     // Energy per clock hour; every other period figure adds hours up.
     const Seconds hour0 = floorDiv(span.start, kHour) * kHour;
@@ -513,21 +521,23 @@ SessionReport analyseSession(const SessionFiles& s, const Thresholds& th,
         q.audio.push_back(a);
     }
 
-    if (!finest.empty())
+    if (!finest.empty()) {
         timeHistory(r, finest, finestLength, haveGeneral ? general : nullptr, generalLength, span);
-    else
+    } else {
         r.history.x = timeAxis(span.start, span.end);
+        r.history.y = levelAxis(1, -1, 10);
+    }
     spectrum(r, s, span);
     if (s.filtered && !s.filtered->stats.empty()) filteredChannel(r, *s.filtered, span);
 
-    if (r.empty) q.flags.push_back("no data");
+    if (finest.empty()) q.flags.push_back("no broadband data");
     if (q.gaps.count) q.flags.push_back("gaps");
     if (q.errors.count) q.flags.push_back("errors");
     if (q.overloads.count) q.flags.push_back("overload");
     if (q.batteryLowCount) q.flags.push_back("battery");
     if (q.temperatureOutCount) q.flags.push_back("temperature");
     if (q.audioFlagged) q.flags.push_back("audio");
-    if (!r.empty && r.leq.flagged) q.flags.push_back("coverage");
+    if (!finest.empty() && r.leq.flagged) q.flags.push_back("coverage");
     if (!r.problems.empty()) q.flags.push_back("input");
     return r;
 }
