@@ -28,27 +28,44 @@ struct Header {
     std::string leqLength = "Not Applicable";
 };
 
+// Joins its parts (appends, which GCC 12 does not mistake for overlapping copies).
+template <typename... Parts>
+std::string cat(const Parts&... parts) {
+    std::string s;
+    (s.append(parts), ...);
+    return s;
+}
+
+// "a","b", (a row's fields, each quoted and followed by a comma)
+inline std::string quoted(const std::vector<std::string>& fields) {
+    std::string s;
+    for (const std::string& f : fields) s.append("\"").append(f).append("\",");
+    return s;
+}
+
 inline std::string headerBlock(const std::string& line1, const Header& h) {
     const auto line = [](const char* key, const std::string& v) {
-        return "\"" + std::string(key) + "\",\"\",\"\",\"\",\"" + v + "\"\r\n";
+        return cat("\"", key, "\",\"\",\"\",\"\",\"", v, "\"\r\n");
     };
     const auto stamp = [](Seconds t) {
         const std::string s = orv_report::formatTime(t, true);  // dd/mm/yyyy hh:mm:ss
-        return s.substr(0, 10) + " - " + s.substr(11);
+        return cat(s.substr(0, 10), " - ", s.substr(11));
     };
-    std::string t = "\"" + line1 + "\"\r\n" + line("Logger Serial Number", h.serial) +
-                    line("Measurement Title", h.title) +
-                    line("Measurement started at", stamp(h.start)) +
-                    line("Measurement stopped at", stamp(h.end)) +
-                    line("Frequency Weighting", h.weighting) + line("Time Averaging", h.averaging) +
-                    line("Statistical Interval", std::to_string(h.statsMinutes) + " min");
+    std::string t = cat("\"", line1, "\"\r\n");
+    t.append(line("Logger Serial Number", h.serial))
+        .append(line("Measurement Title", h.title))
+        .append(line("Measurement started at", stamp(h.start)))
+        .append(line("Measurement stopped at", stamp(h.end)))
+        .append(line("Frequency Weighting", h.weighting))
+        .append(line("Time Averaging", h.averaging))
+        .append(line("Statistical Interval", cat(std::to_string(h.statsMinutes), " min")));
     for (const char* k : {"Auxiliary Power", "Tape Recorder", "Short Term Leq"})
-        t += line(k, "Not Applicable");
-    t += line("Short Term Leq Length", h.leqLength);
+        t.append(line(k, "Not Applicable"));
+    t.append(line("Short Term Leq Length", h.leqLength));
     for (const char* k : {"Start Trigger", "Stop Trigger", "Master Timer", "Sub Timer",
                           "Pre-measurement Reference", "Post-measurement Reference"})
-        t += line(k, "Not Applicable");
-    return t + line("Engineering Units", "dB SPL") + "\r\n";
+        t.append(line(k, "Not Applicable"));
+    return t.append(line("Engineering Units", "dB SPL")).append("\r\n");
 }
 
 inline std::string f1(double v) {
@@ -74,22 +91,21 @@ enum class StatKind { General, Band, Filtered };
 
 inline std::string statFile(StatKind kind, const std::string& label, const Header& h,
                             const std::vector<Row>& rows) {
-    const std::string line1 = kind == StatKind::General ? kLogger
+    const std::string line1 = kind == StatKind::General ? std::string(kLogger)
                               : kind == StatKind::Band
-                                  ? std::string(kLogger) + " - " + label + " Octave Band Results"
-                                  : std::string(kLogger) + " - " + label + " Results";
-    std::string t = headerBlock(line1, h) +
-                    "\"Date\",\"Time\",\"Leq\",\"Lmax\",\"L10\",\"L50\",\"L90\",\"Lmin\"," +
-                    (kind == StatKind::Filtered ? "\"Lpeak\"," : "") +
-                    "\"Temp\",\"Battery\",\"Overload\"\r\n";
+                                  ? cat(kLogger, " - ", label, " Octave Band Results")
+                                  : cat(kLogger, " - ", label, " Results");
+    const bool filtered = kind == StatKind::Filtered;
+    std::string t = headerBlock(line1, h);
+    t.append(quoted({"Date", "Time", "Leq", "Lmax", "L10", "L50", "L90", "Lmin"}))
+        .append(filtered ? quoted({"Lpeak"}) : "")
+        .append("\"Temp\",\"Battery\",\"Overload\"\r\n");
     for (const Row& r : rows) {
-        t += "\"" + date(r.end) + "\",\"" + clock(r.end, kind != StatKind::General) + "\",\"" +
-             f1(r.leq) + "\",\"" + f1(r.lmax) + "\",\"" + f1(r.lmax - 1) + "\",\"" + f1(r.leq) +
-             "\",\"" + f1(r.l90) + "\",\"" + f1(r.l90 - 1) + "\",";
-        if (kind == StatKind::Filtered) t += "\"" + f1(r.lpeak) + "\",";
-        t += "\"" + f1(r.temperature) + "\",\"" + f1(r.battery) + "\",\"" +
-             std::to_string(r.overload) + "\"," +
-             (r.errors ? "\"Errors Found in Interval\"\r\n" : "\r\n");
+        t.append(quoted({date(r.end), clock(r.end, kind != StatKind::General), f1(r.leq),
+                         f1(r.lmax), f1(r.lmax - 1), f1(r.leq), f1(r.l90), f1(r.l90 - 1)}))
+            .append(filtered ? quoted({f1(r.lpeak)}) : "")
+            .append(quoted({f1(r.temperature), f1(r.battery), std::to_string(r.overload)}))
+            .append(r.errors ? "\"Errors Found in Interval\"\r\n" : "\r\n");
     }
     return t;
 }
@@ -104,15 +120,14 @@ struct LeqLine {
 
 inline std::string leqFile(const Header& h, const std::vector<std::string>& bands,
                            const std::vector<LeqLine>& rows) {
-    std::string t = headerBlock(kLogger, h) + "\"Date\",\"Time\",";
-    if (bands.empty()) t += "\"AP Leq\",";
-    for (const std::string& b : bands) t.append("\"").append(b).append("\",");
-    t += "\"Overload\"\r\n";
+    std::string t = headerBlock(kLogger, h);
+    t.append(quoted({"Date", "Time"})).append(bands.empty() ? quoted({"AP Leq"}) : quoted(bands));
+    t.append("\"Overload\"\r\n");
     for (const LeqLine& r : rows) {
-        t += "\"" + date(r.end) + "\",\"'" + clock(r.end, true) + ".0\",";
-        for (double l : r.levels) t.append("\"").append(f1(l)).append("\",");
-        t += "\"" + std::to_string(r.overload) + "\"," +
-             (r.errors ? "\"Errors Found in Interval\"\r\n" : "\r\n");
+        t.append(quoted({date(r.end), cat("'", clock(r.end, true), ".0")}));
+        for (double l : r.levels) t.append(quoted({f1(l)}));
+        t.append(quoted({std::to_string(r.overload)}))
+            .append(r.errors ? "\"Errors Found in Interval\"\r\n" : "\r\n");
     }
     return t;
 }
@@ -120,10 +135,10 @@ inline std::string leqFile(const Header& h, const std::vector<std::string>& band
 // An hourly raw level file with one 100 ms Leq-A per record; times count back from 59:59.9.
 inline std::string rawFile(const std::string& title, const std::string& serial, Seconds hour,
                            const std::vector<double>& leqA) {
-    std::string t =
-        "Session Name,," + title + "\r\nLogger Serial Number,," + serial + "\r\nDate,," +
-        date(hour) + "\r\nHour,," + clock(hour, false).substr(0, 2) +
-        "\r\nTemperature,, 12.5\r\nTime,SPL-A,SPL-C,LEQ-A,LEQ-C,Signal Condition,Battery\r\n";
+    std::string t = cat("Session Name,,", title, "\r\nLogger Serial Number,,", serial, "\r\nDate,,",
+                        date(hour), "\r\nHour,,", clock(hour, false).substr(0, 2),
+                        "\r\nTemperature,, 12.5\r\nTime,SPL-A,SPL-C,LEQ-A,LEQ-C,Signal "
+                        "Condition,Battery\r\n");
     const std::size_t n = leqA.size();
     for (std::size_t i = 0; i < n; ++i) {
         const std::size_t tenths = 36000 - n + i;
