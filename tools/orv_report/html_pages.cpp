@@ -304,8 +304,12 @@ std::string headerTable(const SessionReport& s) {
     row("Statistical interval", s.statsMinutes ? std::to_string(s.statsMinutes) + " min" : "–");
     row("Short Leq length", s.leqSeconds ? std::to_string(s.leqSeconds) + " s" : "–");
     row("Output layout", s.layout);
+    // A band set is 12 or 36 files: the first few stand for the rest (report.json lists all).
+    constexpr std::size_t kListed = 6;
     std::string files;
-    for (const std::string& f : s.files) files += (files.empty() ? "" : "\n") + f;
+    for (std::size_t i = 0; i < std::min(kListed, s.files.size()); ++i)
+        files.append(files.empty() ? "" : "\n").append(s.files[i]);
+    if (s.files.size() > kListed) files.append("\n... and more (report.json lists every file)");
     h += "<tr><th class=\"l\">Files read</th><td class=\"l\" style=\"white-space:pre-line\">" +
          esc(files) + "</td></tr></table>";
     return h;
