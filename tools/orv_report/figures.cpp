@@ -358,9 +358,13 @@ SessionReport analyseSession(const SessionFiles& s, const Thresholds& th,
         if (head && head->start && head->end) r.history.x = timeAxis(*head->start, *head->end);
         return r;
     }
-    span.start =
-        head && head->start && *first > *head->start ? *head->start : *first - finestLength;
-    span.end = std::max(head && head->end ? *head->end : *last, *last);
+    // A header time more than a day away from the rows is not believed (a damaged header
+    // must not stretch the drawings and tables over years).
+    const bool headStart =
+        head && head->start && *first > *head->start && *first - *head->start <= kDay;
+    const bool headEnd = head && head->end && *head->end > *last && *head->end - *last <= kDay;
+    span.start = headStart ? *head->start : *first - finestLength;
+    span.end = headEnd ? *head->end : *last;
     if (useLeq) {
         finestLength = std::max<Seconds>(1, leqFile->header.leqSeconds);
         r.history.source = "short Leq (" + std::to_string(finestLength) + " s)";
