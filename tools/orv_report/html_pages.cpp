@@ -494,12 +494,13 @@ std::string indexPage(const Report& report) {
     else
         b += "<table><tr><th class=\"l\">session</th><th class=\"l\">started</th><th "
              "class=\"l\">stopped</th>"
-             "<th>Lden</th><th>Leq</th><th class=\"l\">flags</th></tr>";
+             "<th class=\"l\">weighting</th><th>Lden</th><th>Leq</th><th "
+             "class=\"l\">flags</th></tr>";
     for (const SessionReport& s : report.sessions)
         b += "<tr><td class=\"l\"><a href=\"" + esc(s.id) + ".html\">" + esc(s.name) +
              "</a></td><td class=\"l\">" + esc(s.start) + "</td><td class=\"l\">" + esc(s.end) +
-             "</td>" + figureCell(s.lden) + figureCell(s.leq) + "<td class=\"l\">" +
-             flagsText(s.quality.flags) + "</td></tr>";
+             "</td><td class=\"l\">" + esc(s.weighting) + "</td>" + figureCell(s.lden) +
+             figureCell(s.leq) + "<td class=\"l\">" + flagsText(s.quality.flags) + "</td></tr>";
     if (!report.sessions.empty()) b += "</table>";
     b += "<p class=\"note\">Coverage in brackets; shaded below " +
          formatFigure(report.thresholds.minCoverage) + " %. Figures in report.json.</p>";
