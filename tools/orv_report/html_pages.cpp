@@ -24,7 +24,7 @@ svg text{font:11px "DejaVu Sans",Arial,sans-serif;fill:#333}
 .sw{display:inline-block;width:12px;height:10px;margin-right:4px;vertical-align:middle}
 @page{size:A4;margin:12mm}
 @media print{body{margin:0;max-width:none;font-size:10px;padding:0} h2{break-after:avoid}
- svg,table,.legend{break-inside:avoid} a{color:inherit;text-decoration:none}}
+ svg,table,.legend,.keep{break-inside:avoid} a{color:inherit;text-decoration:none}}
 )";
 
 std::string esc(const std::string& s) {
@@ -459,7 +459,7 @@ std::string sessionPage(const SessionReport& s, const Report& report) {
              "nothing to show.</p>";
         return page("Session " + s.name, b + qualitySection(s, report));
     }
-    b += "<h2>Time history</h2>" + timeHistorySvg(s);
+    b += "<div class=\"keep\"><h2>Time history</h2>" + timeHistorySvg(s);
     b += "<p class=\"legend\"><span><i class=\"sw\" style=\"background:#1f4e9c\"></i>Leq: " +
          esc(s.history.source) +
          "</span><span><i class=\"sw\" style=\"background:#d62728\"></i>Lmax per interval"
@@ -467,15 +467,15 @@ std::string sessionPage(const SessionReport& s, const Report& report) {
          "<span><i class=\"sw\" style=\"background:#d9d9d9\"></i>no data</span>"
          "<span><i class=\"sw\" style=\"background:#f6c48f\"></i>errors found in interval</span>"
          "<span><i class=\"sw\" style=\"background:#b00020\"></i>overload</span>"
-         "<span>dashed: midnight</span></p>";
+         "<span>dashed: midnight</span></p></div>";
     b += periodsSection(s, report);
     if (s.spectrum) {
         const Spectrum& sp = *s.spectrum;
-        b += "<h2>Spectrum</h2><p class=\"note\">Frequency weighting " + esc(sp.weighting) +
-             "; from the " + esc(sp.source) +
+        b += "<div class=\"keep\"><h2>Spectrum</h2><p class=\"note\">Frequency weighting " +
+             esc(sp.weighting) + "; from the " + esc(sp.source) +
              ". Bars: energy mean of the band Leq over the session; green marks: "
              "median of the interval L90 of each band.</p>" +
-             spectrumSvg(sp) + "<h3>Band Leq over time</h3>" + bandTimeMapSvg(sp);
+             spectrumSvg(sp) + "</div><h3>Band Leq over time</h3>" + bandTimeMapSvg(sp);
     }
     if (s.filtered)
         b += "<h3>Filtered channel " + esc(s.filtered->name) +
