@@ -179,7 +179,8 @@ TEST(DataQuality, GapsErrorsOverloadsBatteryTemperature) {
 }
 
 TEST(DataQuality, AudioAgainstLoggerPerHour) {
-    Header h;  // 12:00-14:00
+    Header h;  // 12:00-13:30: the file of hour 13 must not stretch the session to 14:00
+    h.end = at(0, 13, 30);
     SessionFiles s = leqSession(h, 1, [](Seconds) { return 60.0; });
     const auto raw = [](Seconds hour, std::size_t n, double level) {
         return fromText(rawFile("Site", "TL40217", hour, std::vector<double>(n, level)));
