@@ -229,12 +229,18 @@ TEST(Report, DemoRendersInHeadlessChromium) {
     };
     run("cd " + dir.path() + " && " ORV_DEMO_PATH " --out demo-session");
     run(std::string(ORV_CMD_PATH) + " -s " + (dir / "demo-session") + " -d " + (dir / "results") +
-        " -leq 1 -i 1");
+        " -leq 1 -i 1 -oct 3 Z F -bpf 500 2000 A F -csv");
     run(std::string(ORV_REPORT_PATH) + " " + (dir / "results"));
     const std::string page = dir / "results/report/Demo.html";
     ASSERT_NE(readFile(log).find("Report: " + (dir / "results/report") + "/index.html"),
               std::string::npos);
-    EXPECT_LT(readFile(page).size(), 3U << 20);
+    const std::string html = readFile(page);
+    EXPECT_LT(html.size(), 3U << 20);
+    // Where orv_cmd writes the audio results, the spectrum and the audio check show them.
+    if (testing_support::exists(dir / "results/Demo_LEQ3OCT.csv")) {
+        EXPECT_NE(html.find("Band Leq over time"), std::string::npos);
+        EXPECT_NE(html.find("2 hour(s) compared"), std::string::npos);
+    }
 
     const std::string png = dir / "demo.png";
     run(std::string(chromium) +
