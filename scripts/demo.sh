@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
 # Builds the tools, writes the demo session (a few minutes of a synthetic roadside,
 # crossing an hour) and runs orv_cmd on it: 1-minute statistics, 1-second Leqs, third-octave
-# bands, a band-pass channel and the hourly raw levels from the audio.
+# bands, a band-pass channel and the hourly raw levels from the audio; then writes the
+# HTML report of the results.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 ./scripts/build.sh
@@ -12,3 +13,6 @@ mkdir -p demo
 echo
 echo "Results in demo/results:"
 ls -C demo/results
+# The HTML report of the results; its last line is the path of the report.
+echo
+./build/orv_report demo/results

@@ -43,7 +43,7 @@ TEST(DemoCommandLine, RefusedInput) {
         {"stray"},
         {"--duration", "0"},
         {"--duration", "12s"},
-        {"--duration", "604801"},
+        {"--duration", "1209601"},
         {"--start", "2024-02-30 10:00:00"},  // no such day
         {"--start", "2024-03-05 24:00:00"},
         {"--start", "2024-03-05"},

@@ -275,8 +275,8 @@ std::string checkOptions(const DemoOptions& o) {
         return "the session name must be 1 to 79 characters without '/', '\\' or ','";
     if (o.start.year < 1980 || o.start.year > 2099 || !toSeconds(o.start))
         return "the start must be a valid time in the years 1980 to 2099";
-    if (o.durationSeconds < 1 || o.durationSeconds > 7 * 86400)
-        return "the duration must be 1 to 604800 seconds";
+    if (o.durationSeconds < 1 || o.durationSeconds > 14 * 86400)
+        return "the duration must be 1 to 1209600 seconds (14 days)";
     if (!(o.calibration >= 0.0 && o.calibration < 100.0))
         return "the calibration must be at least 0 and below 100 dB (the information file "
                "holds no sign)";
