@@ -349,8 +349,8 @@ SessionReport analyseSession(const SessionFiles& s, const Thresholds& th,
     for (const auto* parts : {&s.leq, &s.octaveLeq})
         if (!parts->empty() && !parts->front().leq.ends.empty())
             seen(parts->front().leq.ends.front(), parts->front().leq.ends.back());
-    // Hourly raw level files say only which hour they belong to, not which part of it (their
-    // records are stamped back from 59:59.9): they set the span only when nothing else does.
+    // Hourly raw level files are read as whole hours (their records are not placed within
+    // the hour): they set the span only when nothing else does.
     for (const ResultFile& f : s.raw)
         if (f.raw.records && !general && s.leq.empty())
             seen(f.raw.hourStart + kHour, f.raw.hourStart + kHour);
