@@ -1,7 +1,7 @@
 #include "processing/session_driver.h"
 
+#include "input/input_file.h"
 #include "platform/directory.h"
-#include "platform/files.h"
 #include "processing/record_statistics.h"
 #include "results/general_results.h"
 #include "results/leq_results.h"
@@ -55,16 +55,9 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     const std::uint32_t fileCount = session.dataFileCount();
     for (std::uint32_t i = 0; i < fileCount; ++i) {
         const std::string path = session.sessionPath + session.dataFiles[i];
-        if (!platform::readWholeFile(path, fileBytes_)) continue;  // skipped without progress
-
         DataFileHeader header;
-        std::size_t firstRecord = 0;
-        records_.clear();
-        if (parseDataFileHeader(fileBytes_.data(), fileBytes_.size(), header, firstRecord)) {
-            decodeLevelRecords(fileBytes_.data() + firstRecord, fileBytes_.size() - firstRecord,
-                               records_);
-        } else {
-            header = DataFileHeader{};
+        if (loadLevelDataFile(path, fileBytes_, header, records_, out_) == LevelFileLoad::Skipped) {
+            continue;  // skipped without progress
         }
 
         if (!headersWritten) {
