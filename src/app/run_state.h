@@ -4,15 +4,17 @@
 
 #include "config/processing_settings.h"
 #include "platform/console.h"
+#include "results/result_files.h"
 #include "sessions/search_paths.h"
 #include "sessions/session_record.h"
 
 namespace orv {
 
 struct RunState {
-    explicit RunState(platform::Console& console) : out(console) {}
+    explicit RunState(platform::Console& console) : out(console), results(console) {}
 
     platform::Console& out;
+    RunResults results;  // result file names taken, and whether any result was lost
     ProcessingSettings settings;
     SearchPathList searchPaths;
     SessionTable sessions;
@@ -20,8 +22,9 @@ struct RunState {
 
 // Exit statuses of a run.
 inline constexpr int kExitOk = 0;
-inline constexpr int kExitRefused = -1;  // command line refused, or no percentile storage
-inline constexpr int kExitNoMemory = 1;  // work tables could not be allocated
+inline constexpr int kExitRefused = -1;     // command line refused, or no percentile storage
+inline constexpr int kExitNoMemory = 1;     // work tables could not be allocated
+inline constexpr int kExitResultsLost = 2;  // a result file could not be created or written
 
 // One whole run: start-up, command line, session search, every session, summary.
 // `vectorStartupStatus` is the vector-kernel start-up status (20: generic code path).

@@ -33,9 +33,9 @@ ResultHeaderInfo SessionProcessor::headerInfo(const SessionRecord& session,
 
 void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe& pipe) {
     const std::uint32_t timeWeighting = generalTimeWeighting(session);
-    const ResultNaming naming(settings_, session, timeWeighting);
-    GeneralResultsWriter general(out_);
-    LeqResultsWriter leq(out_);
+    const ResultNaming naming(settings_, results_.sessionFileName(session), timeWeighting);
+    GeneralResultsWriter general(results_);
+    LeqResultsWriter leq(results_);
 
     // Result files. Without its general results file a session is skipped; a Leq file
     // that cannot be created switches short-Leq results off for the rest of the run.

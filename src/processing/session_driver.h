@@ -9,6 +9,7 @@
 #include "input/level_data.h"
 #include "ipc/progress_pipe.h"
 #include "platform/console.h"
+#include "results/result_files.h"
 #include "results/result_header.h"
 #include "sessions/session_record.h"
 
@@ -19,8 +20,8 @@ namespace orv {
 // created) carries over to later sessions.
 class SessionProcessor {
 public:
-    SessionProcessor(ProcessingSettings& settings, platform::Console& out)
-        : settings_(settings), out_(out) {}
+    SessionProcessor(ProcessingSettings& settings, RunResults& results)
+        : settings_(settings), results_(results), out_(results.out) {}
 
     void processSession(const SessionRecord& session, ProgressPipe& pipe);
 
@@ -32,6 +33,7 @@ private:
     ResultHeaderInfo headerInfo(const SessionRecord& session, const DataFileHeader& header) const;
 
     ProcessingSettings& settings_;
+    RunResults& results_;
     platform::Console& out_;
     // Reused from file to file: the bytes of one data file and its decoded records.
     std::vector<char> fileBytes_;

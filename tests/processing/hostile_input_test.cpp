@@ -2,7 +2,10 @@
 // result files never leave the output directory, and lost results show in the exit status.
 #include <gtest/gtest.h>
 
+#include <linux/capability.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 
 #include <filesystem>
@@ -14,6 +17,21 @@
 namespace {
 
 using namespace testing_support;
+
+// Runs `f` with the calling thread's permission overrides dropped, so that root (as in CI)
+// meets the permission bits as any user does.
+template <typename F>
+auto WithoutOverridingPermissions(F f) {
+    __user_cap_header_struct header{_LINUX_CAPABILITY_VERSION_3, 0};
+    __user_cap_data_struct saved[2]{}, dropped[2]{};
+    const bool capable = ::syscall(SYS_capget, &header, saved) == 0;
+    std::copy(saved, saved + 2, dropped);
+    dropped[0].effective &= ~((1U << CAP_DAC_OVERRIDE) | (1U << CAP_FOWNER));
+    if (capable) ::syscall(SYS_capset, &header, dropped);
+    auto result = f();
+    if (capable) ::syscall(SYS_capset, &header, saved);
+    return result;
+}
 
 // Offset of line `n` (0-based) of a text.
 std::size_t lineStart(const std::string& text, std::size_t n) {
@@ -188,6 +206,104 @@ TEST_F(HostileInput, DamagedFilesCostNothingElse) {
         EXPECT_EQ(readFile(out() + "/Good.csv"), clean);
         std::filesystem::remove_all(sessions() + "/A" + c.name);
     }
+}
+
+TEST_F(HostileInput, SessionNamesStayInsideTheOutputDirectory) {
+    struct Case {
+        const char* dir;
+        std::string info;
+        const char* fileName;  // of the general results; nullptr: session not added
+        std::string message;   // after "ERR: "
+    };
+    const Case cases[] = {
+        {"Up", "SESSION NAME: ../escaped\r\n", "_._escaped",
+         "Session name of %s cannot be used as a file name - using \"_._escaped\""},
+        {"Ctl",
+         "SESSION NAME: a\\b\x01"
+         "c\r\n",
+         "a_b_c", "Session name of %s cannot be used as a file name - using \"a_b_c\""},
+        {"Dot", "SESSION NAME: .hidden\r\n", "_hidden",
+         "Session name of %s cannot be used as a file name - using \"_hidden\""},
+        {"Unnamed", "", "Unnamed",
+         "Session name of %s cannot be used as a file name - using \"Unnamed\""},
+        {"Dup1", "SESSION NAME: Dup\r\n", "Dup", ""},
+        {"Dup2", "SESSION NAME: Dup\r\n", "Dup_2",
+         "Session name \"Dup\" already used in this run - results of %s named \"Dup_2\""},
+        {"Dup3", "SESSION NAME: Dup\r\n", "Dup_3",
+         "Session name \"Dup\" already used in this run - results of %s named \"Dup_3\""},
+        {"Key", "SESSION NAME: Key\r\nTWEIGHT: 1\r\n" + std::string(60, 'k') + "\r\n", nullptr,
+         "%sKey.inf line 3: key longer than 49 characters - session not added"},
+        {"Fifo", "", nullptr, "%sFifo.inf is not a regular file - skipped"},
+    };
+    for (const Case& c : cases) {
+        SessionLayout layout;
+        layout.info = {};
+        layout.writeInfo = false;
+        const std::string dir = writeSession(sessions() + "/" + c.dir, layout);
+        const std::string inf = dir + "/" + std::filesystem::path(dir).filename().string() + ".inf";
+        if (std::string(c.dir) == "Fifo") {
+            ASSERT_EQ(::mkfifo(inf.c_str(), 0666), 0);
+        } else {
+            writeFile(inf, c.info);
+        }
+    }
+    for (const bool bin : {false, true}) {
+        SCOPED_TRACE(bin ? "-bin" : "flat");
+        std::filesystem::remove_all(out());
+        const RunResult r =
+            run(bin ? std::vector<std::string>{"-bin"} : std::vector<std::string>{});
+        EXPECT_EQ(r.status, 0);
+        for (const Case& c : cases) {
+            SCOPED_TRACE(c.dir);
+            if (!c.message.empty()) {
+                std::string where = sessionDir(c.dir) + "/";
+                std::string message = "ERR: " + c.message + "\r\n";
+                message.replace(message.find("%s"), 2, where);
+                EXPECT_NE(r.output.find(message), std::string::npos) << r.output;
+            }
+            if (c.fileName == nullptr) continue;
+            const std::string general = bin ? out() + "/" + c.fileName + "/GEN_A_15_S.csv"
+                                            : out() + "/" + c.fileName + ".csv";
+            EXPECT_TRUE(exists(general)) << general;
+        }
+        EXPECT_EQ(listNames(dir_.path()), (std::vector<std::string>{"out", "sessions"}));
+        EXPECT_NE(r.output.find("Processed 7 out of 7 sessions"), std::string::npos);
+    }
+}
+
+// A full disk (here the process's file size limit) loses results: one message per file with
+// the system's reason, and the run ends with status 2.
+TEST_F(HostileInput, LostResultsAreReportedAndEndTheRunWithStatus2) {
+    SessionLayout layout = namedSession("Full");
+    layout.levelFiles[0].rows = makeRows(1800, 1);
+    writeSession(sessions() + "/Full", layout);
+    rlimit saved{};
+    ASSERT_EQ(::getrlimit(RLIMIT_FSIZE, &saved), 0);
+    rlimit limit = saved;
+    limit.rlim_cur = 1200;  // the header block and the column line, not all rows
+    ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &limit), 0);
+    const RunResult r = run({"-i", "1", "-leq", "1"});
+    ::setrlimit(RLIMIT_FSIZE, &saved);
+    EXPECT_EQ(r.status, 2);
+    for (const char* name : {"Full.csv", "Full_LEQ.csv"}) {
+        const std::string message =
+            "ERR: Unable to write " + out() + "/" + name + " : File too large\r\n";
+        EXPECT_NE(r.output.find(message), std::string::npos) << r.output;
+        EXPECT_EQ(r.output.find(message), r.output.rfind(message));
+    }
+}
+
+// An old result file in a directory where it cannot be deleted is still written from empty.
+TEST_F(HostileInput, OldResultFileThatCannotBeDeletedIsTruncated) {
+    writeSession(sessions() + "/Old", namedSession("Old"));
+    ASSERT_EQ(run().status, 0);
+    const std::string fresh = readFile(out() + "/Old.csv");
+    writeFile(out() + "/Old.csv", std::string(100000, 'x'));
+    ASSERT_EQ(::chmod(out().c_str(), 0555), 0);
+    const RunResult r = WithoutOverridingPermissions([&] { return run(); });
+    ::chmod(out().c_str(), 0755);
+    EXPECT_EQ(r.status, 0);
+    EXPECT_EQ(readFile(out() + "/Old.csv"), fresh);
 }
 
 }  // namespace
