@@ -37,8 +37,11 @@ bool isCalendarHour(const DataFileHeader& h) {
     return platform::systemTimeToFileTime(t, unused);
 }
 
-LevelFileLoad decode(const std::string& path, const std::vector<char>& bytes,
-                     DataFileHeader& header, LevelRecordQueue& records, platform::Console& out) {
+}  // namespace
+
+LevelFileLoad decodeLevelDataFile(const std::string& path, const std::vector<char>& bytes,
+                                  DataFileHeader& header, LevelRecordQueue& records,
+                                  platform::Console& out) {
     if (bytes.empty()) {
         out.print("ERR: %s is empty - skipped\r\n", path.c_str());
         return LevelFileLoad::NoRecords;
@@ -65,8 +68,6 @@ LevelFileLoad decode(const std::string& path, const std::vector<char>& bytes,
     return LevelFileLoad::Loaded;
 }
 
-}  // namespace
-
 LevelFileLoad loadLevelDataFile(const std::string& path, std::vector<char>& bytes,
                                 DataFileHeader& header, LevelRecordQueue& records,
                                 platform::Console& out) {
@@ -84,7 +85,7 @@ LevelFileLoad loadLevelDataFile(const std::string& path, std::vector<char>& byte
     }
     LevelFileLoad load = LevelFileLoad::NoRecords;
     try {
-        load = decode(path, bytes, header, records, out);
+        load = decodeLevelDataFile(path, bytes, header, records, out);
     } catch (const std::bad_alloc&) {
         // The records of a file too large for memory; the run goes on with the next file.
         records.clear();

@@ -27,9 +27,15 @@ enum class LevelFileLoad {
     Loaded,     // header and records decoded (malformed lines left out)
 };
 
-// Reads the level data file at `path` into `bytes` (reused from file to file), checks its
-// header (a real calendar date and hour) and decodes its records into `records`. Prints one
-// "ERR: " message naming the file for whatever it could not use.
+// Checks the header of a level data file's bytes (a real calendar date and hour) and decodes
+// its records into `records`. Prints one "ERR: " message naming `path` for whatever it could
+// not use. May throw std::bad_alloc.
+LevelFileLoad decodeLevelDataFile(const std::string& path, const std::vector<char>& bytes,
+                                  DataFileHeader& header, LevelRecordQueue& records,
+                                  platform::Console& out);
+
+// Reads the level data file at `path` into `bytes` (reused from file to file), then
+// decodeLevelDataFile; a file whose records do not fit in memory is skipped with a message.
 LevelFileLoad loadLevelDataFile(const std::string& path, std::vector<char>& bytes,
                                 DataFileHeader& header, LevelRecordQueue& records,
                                 platform::Console& out);
