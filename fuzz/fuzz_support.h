@@ -17,8 +17,8 @@ namespace fuzz {
         }                                                                                      \
     } while (false)
 
-// A fresh directory under the system's temporary directory, made once per process and
-// removed when it ends.
+// A fresh directory (in /dev/shm when possible, else under the system's temporary
+// directory), made once per process and removed when it ends.
 const std::string& scratchDirectory();
 
 // Removes everything below `dir` (not `dir` itself).

@@ -85,6 +85,17 @@ bool ResultFile::create(const std::string& path, RunResults& run) {
     return false;
 }
 
+ResultFile& ResultFile::operator=(ResultFile&& other) {
+    if (this != &other) {
+        close();  // reports a failed close of the file it held
+        file_ = std::move(other.file_);
+        path_ = std::move(other.path_);
+        run_ = other.run_;
+        reported_ = other.reported_;
+    }
+    return *this;
+}
+
 bool ResultFile::write(std::string_view text) {
     if (!file_.valid()) return false;
     int error = 0;

@@ -55,8 +55,8 @@ private:
 class ResultFile {
 public:
     ResultFile() = default;
-    ResultFile(ResultFile&&) = default;
-    ResultFile& operator=(ResultFile&&) = default;
+    ResultFile(ResultFile&&) = default;  // the moved-from file is closed
+    ResultFile& operator=(ResultFile&& other);
     ~ResultFile() { close(); }
 
     // Creates the file anew (replacing and truncating an old one). False on failure.
