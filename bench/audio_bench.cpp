@@ -94,7 +94,7 @@ double gateReadDispatch(const std::string& sessionDir, bool rawExport) {
     session.sessionPath = sessionDir + "/";
     session.waveFiles = {"data.000/20240305_120000.wav"};
     std::vector<char> bytes;
-    platform::readWholeFile(sessionDir + "/data.000/20240305_12.csv", bytes);
+    platform::readRegularFile(sessionDir + "/data.000/20240305_12.csv", bytes, ~0ULL);
     orv::DataFileHeader header;
     std::size_t first = 0;
     orv::LevelRecordQueue records;
@@ -108,7 +108,8 @@ double gateReadDispatch(const std::string& sessionDir, bool rawExport) {
     options.dispatch.workerLimit = 2;
     options.preRollSeconds = 3;
     std::set<std::string> written;
-    orv::HourlyRawFiles files(sessionDir + "/", written, console);
+    orv::RunResults run(console);
+    orv::HourlyRawFiles files(sessionDir + "/", written, run);
     orv::RawLevelExport exporter(10.0F, 1.0F, files, console);
     const auto start = Clock::now();
     {
@@ -140,7 +141,7 @@ double gateReadDispatch(const std::string& sessionDir, bool rawExport) {
 double readOnce(const std::string& path) {
     const auto start = Clock::now();
     std::vector<char> bytes;
-    if (!platform::readWholeFile(path, bytes)) std::abort();
+    if (platform::readRegularFile(path, bytes, ~0ULL) != platform::ReadResult::Ok) std::abort();
     return seconds(start);
 }
 

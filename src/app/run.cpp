@@ -34,7 +34,7 @@ int run(RunState& state, int argc, const char* const* argv) {
 
     std::uint32_t processed = 0;
     {
-        SessionProcessor processor(state.settings, out, state.analysis, state.env.audio);
+        SessionProcessor processor(state.settings, state.results, state.analysis, state.env.audio);
         for (std::uint32_t i = 0; i < found; ++i) {
             if (i < state.sessions.count()) {
                 processor.processSession(state.sessions.entries[i], pipe);
@@ -45,7 +45,8 @@ int run(RunState& state, int argc, const char* const* argv) {
 
     out.print("\r\n");
     out.print("Processed %u out of %u sessions\r\n", processed, found);
-    const int status = processed == found ? kExitOk : kExitRefused;
+    int status = processed == found ? kExitOk : kExitRefused;
+    if (status == kExitOk && state.results.lost()) status = kExitResultsLost;
     pipe.close();
     return status;
 }

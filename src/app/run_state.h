@@ -6,6 +6,7 @@
 #include "config/processing_settings.h"
 #include "platform/console.h"
 #include "processing/session_driver.h"
+#include "results/result_files.h"
 #include "sessions/search_paths.h"
 #include "sessions/session_record.h"
 
@@ -21,12 +22,13 @@ struct RunEnvironment {
 
 struct RunState {
     RunState(platform::Console& console, const RunEnvironment& environment)
-        : out(console), env(environment) {
+        : out(console), env(environment), results(console) {
         analysis.filterErrorPause = environment.filterErrorPause;
     }
 
     platform::Console& out;
     RunEnvironment env;
+    RunResults results;  // result file names taken, and whether any result was lost
     ProcessingSettings settings;
     SearchPathList searchPaths;
     SessionTable sessions;
@@ -35,8 +37,9 @@ struct RunState {
 
 // Exit statuses of a run.
 inline constexpr int kExitOk = 0;
-inline constexpr int kExitRefused = -1;  // command line refused, or no percentile storage
-inline constexpr int kExitNoMemory = 1;  // work tables could not be allocated
+inline constexpr int kExitRefused = -1;     // command line refused, or no percentile storage
+inline constexpr int kExitNoMemory = 1;     // work tables could not be allocated
+inline constexpr int kExitResultsLost = 2;  // a result file could not be created or written
 
 // One whole run: start-up, command line, session search, every session, summary.
 int runOrvCmd(int argc, const char* const* argv, platform::Console& out,

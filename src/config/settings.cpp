@@ -140,15 +140,14 @@ int initDefaults(ProcessingSettings& s, SearchPathList& paths, SessionTable& ses
     }
     s.statsIntervalMin = 15;
     out.print("Using %umin statistics interval length\r\n", s.statsIntervalMin);
-    paths.paths.clear();
+    paths.clear();
     sessions.entries.clear();
     s.recursiveSearch = 0;
     return 1;
 }
 
 void releaseLists(ProcessingSettings& s, SearchPathList& paths, SessionTable& sessions) {
-    paths.paths.clear();
-    paths.paths.shrink_to_fit();
+    paths.clear();
     sessions.entries.clear();
     s.recursiveSearch = 0;
     s.percentiles.clear();

@@ -46,21 +46,36 @@ struct LevelRecordQueue {
     std::size_t size() const { return records.size(); }
 };
 
-// Fills `header` from the six header lines of `data` and sets `firstRecord` to the offset
-// of line 7. False when the header is not well formed.
+// The highest level a record may carry (dB); a record with a higher level is malformed.
+inline constexpr float kMaxLevelDb = 250.0F;
+
+// Lines end with CR LF, LF or CR alike.
+//
+// Fills `header` from the six header lines of `data` and sets `afterHeader` to the offset of
+// line 7, which may be the end of the data. False when the header is not well formed.
+bool parseHeaderLines(const char* data, std::size_t length, DataFileHeader& header,
+                      std::size_t& afterHeader);
+// parseHeaderLines, and at least one byte must follow the header: `firstRecord` is its offset.
 bool parseDataFileHeader(const char* data, std::size_t length, DataFileHeader& header,
                          std::size_t& firstRecord);
 
-// Replaces the queue's contents with the records in data[0, length). Decoding stops at the
-// first malformed record; the records before it stay queued.
-void decodeLevelRecords(const char* data, std::size_t length, LevelRecordQueue& queue);
+// What decoding left out: malformed lines, counted from line 1 at the start of the data.
+struct DecodeReport {
+    std::size_t firstBadLine = 0;  // 0 when every line was well formed
+    std::size_t badLines = 0;
+};
+
+// Replaces the queue's contents with the records in data[0, length), in file order. A
+// malformed line (a field that is not well formed, a level above kMaxLevelDb, a number that
+// does not fit its field, a line cut short) is left out on its own and decoding goes on at
+// the next line; empty lines are passed over.
+DecodeReport decodeLevelRecords(const char* data, std::size_t length, LevelRecordQueue& queue);
 
 // The steps of the header parse, each reading one line from `pos` (bounded by `end`) and
 // leaving `pos` at the start of the next line; false when the line is not well formed.
 //
 // Header lines 1 and 2: the text after the line's first comma and any blanks and commas,
-// up to a line feed, a comma or `size` - 1 characters; a carriage return before the line
-// feed is not part of it.
+// up to the line end, a comma or `size` - 1 characters.
 bool extractHeaderField(const char*& pos, const char* end, std::string& dest, std::size_t size);
 // Header line 3: day, month and year, each number followed by one separator.
 bool parseHeaderDate(const char*& pos, const char* end, DataFileHeader& header);

@@ -1,10 +1,12 @@
 #include "platform/files.h"
 
 #include <fcntl.h>
+#include <signal.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <new>
 
 namespace platform {
 
@@ -16,9 +18,11 @@ File& File::operator=(File&& other) noexcept {
     return *this;
 }
 
-void File::close() {
-    if (fd_ >= 0) ::close(fd_);
+int File::close() {
+    int error = 0;
+    if (fd_ >= 0 && ::close(fd_) != 0 && errno != EINTR) error = errno;
     fd_ = -1;
+    return error;
 }
 
 int File::release() {
@@ -92,40 +96,59 @@ File openForRead(const std::string& path, int* error) {
     return File(fd);
 }
 
-bool readWholeFile(const std::string& path, std::vector<char>& out, int* error) {
-    File f = openForRead(path, error);
-    if (!f.valid()) return false;
-    struct stat st {};
-    if (::fstat(f.fd(), &st) != 0 || !S_ISREG(st.st_mode)) {
-        if (error != nullptr) *error = S_ISDIR(st.st_mode) ? EISDIR : errno;
-        return false;
+ReadResult readRegularFile(const std::string& path, std::vector<char>& out, std::uint64_t maxSize,
+                           int* error) {
+    const int fd = ::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    if (fd < 0) {
+        if (error != nullptr) *error = errno;
+        return ReadResult::OpenFailed;
     }
-    const auto size = static_cast<std::size_t>(st.st_size);
-    out.resize(size);
-    return f.read(out.data(), size, error) == size;
+    File f(fd);
+    struct stat st {};
+    if (::fstat(fd, &st) != 0) {
+        if (error != nullptr) *error = errno;
+        return ReadResult::OpenFailed;
+    }
+    if (!S_ISREG(st.st_mode)) return ReadResult::NotRegular;
+    const auto size = static_cast<std::uint64_t>(st.st_size);
+    if (size > maxSize) return ReadResult::TooLarge;
+    try {
+        out.resize(static_cast<std::size_t>(size));
+    } catch (const std::bad_alloc&) {
+        return ReadResult::NoMemory;
+    }
+    int readError = 0;
+    if (f.read(out.data(), out.size(), &readError) != out.size()) {
+        if (error != nullptr) *error = readError != 0 ? readError : EIO;
+        return ReadResult::ReadFailed;
+    }
+    return ReadResult::Ok;
 }
 
-File openAlways(const std::string& path, int* error) {
-    const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0666);
-    if (fd < 0 && error != nullptr) *error = errno;
-    return File(fd);
-}
-
-File createResultFile(const std::string& path, int* error) {
-    deleteFile(path);
-    return openAlways(path, error);
-}
-
-bool readTextFile(const std::string& path, std::string& out, int* error) {
+ReadResult readTextFile(const std::string& path, std::string& out, std::uint64_t maxSize,
+                        int* error) {
     std::vector<char> bytes;
-    if (!readWholeFile(path, bytes, error)) return false;
-    out.clear();
-    out.reserve(bytes.size());
+    const ReadResult result = readRegularFile(path, bytes, maxSize, error);
+    if (result != ReadResult::Ok) return result;
+    try {
+        out.clear();
+        out.reserve(bytes.size());
+    } catch (const std::bad_alloc&) {
+        return ReadResult::NoMemory;
+    }
     for (std::size_t i = 0; i < bytes.size(); ++i) {
         if (bytes[i] == '\r' && i + 1 < bytes.size() && bytes[i + 1] == '\n') continue;
         out.push_back(bytes[i]);
     }
-    return true;
+    return ReadResult::Ok;
+}
+
+File createResultFile(const std::string& path, int* error) {
+    ::signal(SIGXFSZ, SIG_IGN);
+    deleteFile(path);
+    const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+    if (fd < 0 && error != nullptr) *error = errno;
+    return File(fd);
 }
 
 bool deleteFile(const std::string& path) { return ::unlink(path.c_str()) == 0; }

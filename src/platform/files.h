@@ -21,7 +21,9 @@ public:
 
     bool valid() const { return fd_ >= 0; }
     int fd() const { return fd_; }
-    void close();
+    // Closes the descriptor; the system's error code when closing reported one (a write that
+    // could not be completed may show only here), else 0.
+    int close();
     int release();
 
     // Writes all bytes; returns how many were written (fewer on error; `error` gets errno).
@@ -44,15 +46,28 @@ private:
 
 // Opens an existing file for reading.
 File openForRead(const std::string& path, int* error = nullptr);
-// Reads a whole file; false (with errno in `error`) when it cannot be opened or fewer bytes
-// than its size arrive.
-bool readWholeFile(const std::string& path, std::vector<char>& out, int* error = nullptr);
-// Opens for writing, creating it when missing (mode 0666, umask applies), without truncating.
-File openAlways(const std::string& path, int* error = nullptr);
-// Result files: delete any old file of the name, then create it anew.
+
+enum class ReadResult {
+    Ok,
+    OpenFailed,  // `error` holds the reason
+    NotRegular,  // a directory, FIFO, device or socket
+    TooLarge,    // larger than the caller's bound
+    NoMemory,    // the bytes cannot be held in memory
+    ReadFailed,  // `error` holds the reason (EIO when the file ended early)
+};
+// Reads a whole regular file. It is opened without blocking, so a FIFO or device in its
+// place cannot stall the caller, and is refused unless it is a regular file no larger than
+// `maxSize` bytes; nothing is allocated for a refused file.
+ReadResult readRegularFile(const std::string& path, std::vector<char>& out, std::uint64_t maxSize,
+                           int* error = nullptr);
+// readRegularFile, then as a text-mode reader does: every CR LF becomes LF, a lone CR stays.
+ReadResult readTextFile(const std::string& path, std::string& out, std::uint64_t maxSize,
+                        int* error = nullptr);
+// Result files: delete any old file of the name, then create it, truncated to nothing when
+// the old file could not be deleted (mode 0666, umask applies). From the first call on,
+// SIGXFSZ is ignored, so a write beyond the process's file size limit fails with EFBIG and is
+// reported like a full disk instead of ending the process.
 File createResultFile(const std::string& path, int* error = nullptr);
-// Reads a text file as a text-mode reader does: every CR LF becomes LF, a lone CR stays.
-bool readTextFile(const std::string& path, std::string& out, int* error = nullptr);
 bool deleteFile(const std::string& path);
 
 }  // namespace platform

@@ -46,12 +46,18 @@ RecordStatistics::RecordStatistics(const ProcessingSettings& settings, bool trig
 void RecordStatistics::sequenceCheck(const LevelRecord& r, const DataFileHeader& header) {
     const platform::FileTime hour = hourOf(header);
     const std::uint32_t tenth = tenthOfHour(r);
+    // A time with a field out of its range (0:60.0, 0:29.10) is never the expected time, even
+    // where its fields add up to it. It stands where the expected record should be, so it is
+    // marked without re-synchronising.
+    const bool inRange = r.minute < 60 && r.second < 60 && r.tenth < 10;
     if (firstRecord_) {
         firstRecord_ = false;
         expectedHour_ = hour;
-        expectedTenth_ = tenth;
+        expectedTenth_ = inRange ? tenth : 0;
     }
-    if (hour != expectedHour_ || tenth != expectedTenth_) {
+    if (!inRange) {
+        gapFlag_ = 1;
+    } else if (hour != expectedHour_ || tenth != expectedTenth_) {
         // Every break re-synchronises, so the interval after a marked one is marked only
         // when it has a break of its own.
         gapFlag_ = 1;

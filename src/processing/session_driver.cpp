@@ -3,8 +3,8 @@
 #include <optional>
 
 #include "analysis/raw_export.h"
+#include "input/input_file.h"
 #include "platform/directory.h"
-#include "platform/files.h"
 #include "platform/system_info.h"
 #include "processing/record_statistics.h"
 #include "processing/session_audio.h"
@@ -53,7 +53,7 @@ unsigned SessionProcessor::workerLimit() const {
 
 void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe& pipe) {
     const std::uint32_t timeWeighting = generalTimeWeighting(session);
-    SessionResultFiles files(settings_, session, timeWeighting, out_);
+    SessionResultFiles files(settings_, results_.sessionFileName(session), timeWeighting, results_);
     // Without its general results file a session is skipped.
     if (!files.create()) return;
     if (!platform::isDirectory(session.sessionPath)) return;
@@ -67,7 +67,7 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     PendingIntervalMap pending(files.bands, leqOn ? &files.leq : nullptr);
     const BlockWorker worker(analysis, pending, analysisState_, out_);
     // The hourly raw levels, from every block before it is queued.
-    HourlyRawFiles rawFiles(files.naming().directory(), analysisState_.rawFilesWritten, out_);
+    HourlyRawFiles rawFiles(files.naming().directory(), analysisState_.rawFilesWritten, results_);
     RawLevelExport rawExport(analysis.calibrationGain, analysis.rangeMultiplier, rawFiles, out_);
     BlockObserver* observer = settings_.rawLevelCsv != 0 ? &rawExport : nullptr;
     std::optional<SessionAudio> audio;
@@ -86,16 +86,9 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     const std::uint32_t fileCount = session.dataFileCount();
     for (std::uint32_t i = 0; i < fileCount; ++i) {
         const std::string path = session.sessionPath + session.dataFiles[i];
-        if (!platform::readWholeFile(path, fileBytes_)) continue;  // skipped without progress
-
         DataFileHeader header;
-        std::size_t firstRecord = 0;
-        records_.clear();
-        if (parseDataFileHeader(fileBytes_.data(), fileBytes_.size(), header, firstRecord)) {
-            decodeLevelRecords(fileBytes_.data() + firstRecord, fileBytes_.size() - firstRecord,
-                               records_);
-        } else {
-            header = DataFileHeader{};
+        if (loadLevelDataFile(path, fileBytes_, header, records_, out_) == LevelFileLoad::Skipped) {
+            continue;  // skipped without progress
         }
 
         if (!headersWritten) {

@@ -12,6 +12,7 @@
 #include "ipc/progress_pipe.h"
 #include "platform/console.h"
 #include "platform/thread_pool.h"
+#include "results/result_files.h"
 #include "results/result_header.h"
 #include "sessions/session_record.h"
 
@@ -29,10 +30,11 @@ struct AudioRunOptions {
 // created) carries over to later sessions.
 class SessionProcessor {
 public:
-    SessionProcessor(ProcessingSettings& settings, platform::Console& out,
+    SessionProcessor(ProcessingSettings& settings, RunResults& results,
                      AnalysisRunState& analysisState, const AudioRunOptions& audioOptions)
         : settings_(settings),
-          out_(out),
+          results_(results),
+          out_(results.out),
           analysisState_(analysisState),
           audioOptions_(audioOptions) {}
 
@@ -48,6 +50,7 @@ private:
     unsigned workerLimit() const;
 
     ProcessingSettings& settings_;
+    RunResults& results_;
     platform::Console& out_;
     AnalysisRunState& analysisState_;
     AudioRunOptions audioOptions_;

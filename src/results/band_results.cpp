@@ -13,9 +13,7 @@ const char* bandName(std::uint32_t band, std::uint32_t bandCount) {
                            : SlmLibrary::OctaveFilter::getFullName(band);
 }
 
-bool writeAll(platform::File& file, const std::string& text) {
-    return file.valid() && file.write(text) == text.size();
-}
+bool writeAll(ResultFile& file, const std::string& text) { return file.write(text); }
 
 void appendLevels(TextBuffer& b, const BandIntervalResult& r) {
     for (float v : r.percentileLevels) b.append("\"%.1f\",", static_cast<double>(v));
@@ -27,20 +25,19 @@ bool BandResultsWriter::openBandFiles(const ResultNaming& naming, std::uint32_t 
     bandCount_ = bandCount;
     bandFiles_.clear();
     for (std::uint32_t b = 0; b < bandCount; ++b) {
-        bandFiles_.push_back(createResultFile(naming.octaveBand(b, bandCount), out_));
-        if (!bandFiles_.back().valid()) return false;
+        bandFiles_.emplace_back();
+        if (!bandFiles_.back().create(naming.octaveBand(b, bandCount), run_)) return false;
     }
     return true;
 }
 
 bool BandResultsWriter::openFilteredFile(const std::string& path, std::uint32_t filterType) {
     filterType_ = filterType;
-    filteredFile_ = createResultFile(path, out_);
-    return filteredFile_.valid();
+    return filteredFile_.create(path, run_);
 }
 
 void BandResultsWriter::close() {
-    for (platform::File& f : bandFiles_) f.close();
+    for (ResultFile& f : bandFiles_) f.close();
     filteredFile_.close();
 }
 
@@ -103,10 +100,10 @@ bool BandResultsWriter::writeBlock(const BlockResult& block) {
     bool all = true;
     for (std::size_t i = 0; i < block.bands.size(); ++i) {
         if (i < bandCount_) {
-            if (i < bandFiles_.size() && bandFiles_[i].valid()) {
+            if (i < bandFiles_.size() && bandFiles_[i].isOpen()) {
                 all = writeAll(bandFiles_[i], formatBandRow(block.time, block.bands[i])) && all;
             }
-        } else if (filterType_ != 0 && filteredFile_.valid()) {
+        } else if (filterType_ != 0 && filteredFile_.isOpen()) {
             all = writeAll(filteredFile_, formatFilteredRow(block.time, block.bands[i])) && all;
         }
     }

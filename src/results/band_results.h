@@ -10,8 +10,6 @@
 #include <vector>
 
 #include "analysis/band_interval_result.h"
-#include "platform/console.h"
-#include "platform/files.h"
 #include "results/leq_results.h"
 #include "results/result_files.h"
 #include "results/result_header.h"
@@ -20,7 +18,7 @@ namespace orv {
 
 class BandResultsWriter {
 public:
-    explicit BandResultsWriter(platform::Console& out) : out_(out) {}
+    explicit BandResultsWriter(RunResults& run) : run_(run) {}
 
     // Creates one file per band, in band order. False (message printed) at the first that
     // cannot be created; the files already created stay open until close.
@@ -44,11 +42,11 @@ public:
                                          const BandIntervalResult& r);
 
 private:
-    platform::Console& out_;
+    RunResults& run_;
     std::uint32_t bandCount_ = 0;
-    std::vector<platform::File> bandFiles_;
+    std::vector<ResultFile> bandFiles_;
     std::uint32_t filterType_ = 0;
-    platform::File filteredFile_;
+    ResultFile filteredFile_;
 };
 
 // Results of analysed blocks waiting for their turn. Each block is entered under its

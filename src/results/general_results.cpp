@@ -1,30 +1,20 @@
 #include "results/general_results.h"
 
 #include "fweight.h"
-#include "results/result_files.h"
 #include "results/text_buffer.h"
 #include "tweight.h"
 
 namespace orv {
 
-bool GeneralResultsWriter::open(const std::string& path) {
-    file_ = createResultFile(path, out_);
-    return file_.valid();
-}
-
-bool GeneralResultsWriter::writeAll(const std::string& text) {
-    return file_.write(text) == text.size();
-}
-
 bool GeneralResultsWriter::writeHeader(const ResultHeaderInfo& info,
                                        std::uint32_t generalTimeWeighting) {
-    if (!file_.valid()) return false;
+    if (!file_.isOpen()) return false;
     const std::string block = formatHeaderBlock(
         info, kGeneralFirstLine, SlmLibrary::FWeight::longName(info.generalWeighting),
         SlmLibrary::TWeight::longName(generalTimeWeighting), 0);
-    return writeAll(block) && writeAll("\"Date\",\"Time\",\"Leq\",\"Lmax\",") &&
-           writeAll(percentileLabels(info.percentiles)) &&
-           writeAll("\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r\n");
+    return file_.write(block) && file_.write("\"Date\",\"Time\",\"Leq\",\"Lmax\",") &&
+           file_.write(percentileLabels(info.percentiles)) &&
+           file_.write("\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r\n");
 }
 
 std::string GeneralResultsWriter::formatRow(const GeneralIntervalRecord& r) {
@@ -39,8 +29,8 @@ std::string GeneralResultsWriter::formatRow(const GeneralIntervalRecord& r) {
 }
 
 bool GeneralResultsWriter::writeRow(const GeneralIntervalRecord& r) {
-    if (!file_.valid()) return true;
-    return writeAll(formatRow(r));
+    if (!file_.isOpen()) return true;
+    return file_.write(formatRow(r));
 }
 
 }  // namespace orv

@@ -5,8 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/console.h"
-#include "platform/files.h"
+#include "results/result_files.h"
 #include "results/result_header.h"
 
 namespace orv {
@@ -27,12 +26,12 @@ struct GeneralIntervalRecord {
 
 class GeneralResultsWriter {
 public:
-    explicit GeneralResultsWriter(platform::Console& out) : out_(out) {}
+    explicit GeneralResultsWriter(RunResults& run) : run_(run) {}
 
     // Creates the file (replacing an old one). False, with the open message, on failure.
-    bool open(const std::string& path);
+    bool open(const std::string& path) { return file_.create(path, run_); }
     void close() { file_.close(); }
-    bool isOpen() const { return file_.valid(); }
+    bool isOpen() const { return file_.isOpen(); }
 
     // Header block (line 6 the frequency weighting, line 7 the time weighting of the session)
     // and the column line. False when the file is not open or a write fell short.
@@ -43,10 +42,8 @@ public:
     static std::string formatRow(const GeneralIntervalRecord& r);
 
 private:
-    bool writeAll(const std::string& text);
-
-    platform::Console& out_;
-    platform::File file_;
+    RunResults& run_;
+    ResultFile file_;
 };
 
 }  // namespace orv

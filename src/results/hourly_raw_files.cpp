@@ -36,13 +36,12 @@ bool HourlyRawFiles::write(const DataFileHeader& header,
         path = ResultNaming::leqPart(directory_ + name, part);
     }
     if (path != directory_ + name) {
-        out_.print("MSG: %s%s was written earlier in this run - this hour goes to %s\r\n",
-                   directory_.c_str(), name.c_str(), path.c_str());
+        run_.out.print("MSG: %s%s was written earlier in this run - this hour goes to %s\r\n",
+                       directory_.c_str(), name.c_str(), path.c_str());
     }
     written_.insert(path);
-    platform::File file = createResultFile(path, out_);
-    const std::string text = fileText(header, records);
-    return file.valid() && file.write(text) == text.size();
+    ResultFile file;
+    return file.create(path, run_) && file.write(fileText(header, records));
 }
 
 }  // namespace orv

@@ -9,7 +9,7 @@
 
 #include "input/level_data.h"
 #include "platform/civil_time.h"
-#include "platform/console.h"
+#include "results/result_files.h"
 
 namespace orv {
 
@@ -29,8 +29,8 @@ public:
     // `directory` ends with the path separator. `written` holds the paths written so far in
     // the run: a name already used gets "_1", "_2", ... before ".csv", so no session's hour
     // replaces another's.
-    HourlyRawFiles(std::string directory, std::set<std::string>& written, platform::Console& out)
-        : directory_(std::move(directory)), written_(written), out_(out) {}
+    HourlyRawFiles(std::string directory, std::set<std::string>& written, RunResults& run)
+        : directory_(std::move(directory)), written_(written), run_(run) {}
 
     // Writes one hour's file: the header of the hour's level data file, then the records.
     bool write(const DataFileHeader& header, const std::vector<RawLevelRecord>& records);
@@ -42,7 +42,7 @@ public:
 private:
     std::string directory_;
     std::set<std::string>& written_;
-    platform::Console& out_;
+    RunResults& run_;
 };
 
 }  // namespace orv

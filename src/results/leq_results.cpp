@@ -14,8 +14,7 @@ bool LeqResultsWriter::open(LeqFileKind kind, const std::string& path) {
     f.header.clear();
     f.lines = 0;
     f.part = 0;
-    f.handle = createResultFile(path, out_);
-    return f.handle.valid();
+    return f.handle.create(path, run_);
 }
 
 void LeqResultsWriter::close(LeqFileKind kind) {
@@ -27,7 +26,7 @@ bool LeqResultsWriter::formatHeader(LeqFileKind kind, const ResultHeaderInfo& in
                                     std::uint32_t bandCount, const std::string& extraColumn) {
     std::lock_guard<std::mutex> lock(mutex_);
     LeqFile& f = file(kind);
-    if (!f.handle.valid()) return false;
+    if (!f.handle.isOpen()) return false;
     f.bandCount = bandCount;
     f.extraColumn = extraColumn;
     const std::uint32_t leqSeconds = displayInterval(info.leqInterval);
@@ -52,7 +51,7 @@ bool LeqResultsWriter::writeColumnHeader(LeqFileKind kind) {
 
 bool LeqResultsWriter::writeColumnHeaderLocked(LeqFileKind kind) {
     LeqFile& f = file(kind);
-    f.handle.write(f.header);  // a short header write is not looked at; the column line is
+    const bool header = f.handle.write(f.header);
     std::string columns;
     if (kind == LeqFileKind::AllPass) {
         columns = "\"Date\",\"Time\",\"AP Leq\",\"Overload\"\r\n";
@@ -67,9 +66,9 @@ bool LeqResultsWriter::writeColumnHeaderLocked(LeqFileKind kind) {
         b.append("\"Overload\"\r\n");
         columns = b.str();
     }
-    if (f.handle.write(columns) != columns.size()) return false;
-    f.lines = kHeaderLines;
-    return true;
+    const bool written = f.handle.write(columns) && header;
+    f.lines = kHeaderLines;  // counted whether or not they reached the file, as rows are
+    return written;
 }
 
 std::string LeqResultsWriter::formatRow(const LeqRow& row) {
@@ -102,7 +101,7 @@ bool LeqResultsWriter::writeRows(const std::vector<LeqRow>& rows) {
     for (std::size_t k = 0; k < 2; ++k) {
         LeqFile& f = files_[k];
         if (pending[k].empty()) continue;
-        if (!f.handle.valid() || f.handle.write(pending[k]) != pending[k].size()) all = false;
+        if (!f.handle.write(pending[k])) all = false;
     }
     return all;
 }
@@ -113,8 +112,8 @@ bool LeqResultsWriter::addLineLocked(LeqFileKind kind, const std::string& line,
     if (f.name.empty()) return false;  // that file was never opened in this session
     pending += line;
     // The line counts whether or not it reaches the file.
-    if (++f.lines < linesPerPart_) return f.handle.valid();
-    const bool written = f.handle.valid() && f.handle.write(pending) == pending.size();
+    if (++f.lines < linesPerPart_) return f.handle.isOpen();
+    const bool written = f.handle.write(pending);
     pending.clear();
     rollOverLocked(kind);
     return written;
@@ -124,8 +123,7 @@ void LeqResultsWriter::rollOverLocked(LeqFileKind kind) {
     LeqFile& f = file(kind);
     f.handle.close();
     ++f.part;
-    f.handle = createResultFile(ResultNaming::leqPart(f.name, f.part), out_);
-    if (f.handle.valid()) writeColumnHeaderLocked(kind);
+    if (f.handle.create(ResultNaming::leqPart(f.name, f.part), run_)) writeColumnHeaderLocked(kind);
 }
 
 }  // namespace orv

@@ -10,8 +10,6 @@
 #include <vector>
 
 #include "platform/civil_time.h"
-#include "platform/console.h"
-#include "platform/files.h"
 #include "results/result_files.h"
 #include "results/result_header.h"
 
@@ -30,8 +28,8 @@ public:
     static constexpr std::uint32_t kLinesPerPart = 1U << 20;
     static constexpr std::uint32_t kHeaderLines = 21;
 
-    explicit LeqResultsWriter(platform::Console& out, std::uint32_t linesPerPart = kLinesPerPart)
-        : out_(out), linesPerPart_(linesPerPart) {}
+    explicit LeqResultsWriter(RunResults& run, std::uint32_t linesPerPart = kLinesPerPart)
+        : run_(run), linesPerPart_(linesPerPart) {}
 
     // Creates part 0 of a file. False (message printed) when it cannot be created.
     bool open(LeqFileKind kind, const std::string& path);
@@ -56,7 +54,7 @@ public:
 
 private:
     struct LeqFile {
-        platform::File handle;
+        ResultFile handle;
         std::string name;             // part 0; the base of the roll-over names
         std::string header;           // formatted header block
         std::uint32_t bandCount = 1;  // columns of the octave file
@@ -71,7 +69,7 @@ private:
     bool addLineLocked(LeqFileKind kind, const std::string& line, std::string& pending);
     void rollOverLocked(LeqFileKind kind);
 
-    platform::Console& out_;
+    RunResults& run_;
     const std::uint32_t linesPerPart_;
     mutable std::mutex mutex_;
     std::array<LeqFile, 2> files_;

@@ -2,13 +2,13 @@
 
 namespace orv {
 
-SessionResultFiles::SessionResultFiles(ProcessingSettings& settings, const SessionRecord& session,
-                                       std::uint32_t generalTimeWeighting, platform::Console& out)
-    : general(out),
-      leq(out),
-      bands(out),
+SessionResultFiles::SessionResultFiles(ProcessingSettings& settings, std::string sessionFileName,
+                                       std::uint32_t generalTimeWeighting, RunResults& run)
+    : general(run),
+      leq(run),
+      bands(run),
       settings_(settings),
-      naming_(settings, session, generalTimeWeighting),
+      naming_(settings, std::move(sessionFileName), generalTimeWeighting),
       generalTimeWeighting_(generalTimeWeighting) {}
 
 bool SessionResultFiles::create() {

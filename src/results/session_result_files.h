@@ -10,14 +10,14 @@
 #include "results/general_results.h"
 #include "results/leq_results.h"
 #include "results/result_files.h"
-#include "sessions/session_record.h"
 
 namespace orv {
 
 class SessionResultFiles {
 public:
-    SessionResultFiles(ProcessingSettings& settings, const SessionRecord& session,
-                       std::uint32_t generalTimeWeighting, platform::Console& out);
+    // `sessionFileName`: the name the session's files carry (RunResults::sessionFileName).
+    SessionResultFiles(ProcessingSettings& settings, std::string sessionFileName,
+                       std::uint32_t generalTimeWeighting, RunResults& run);
 
     // Creates the session's files. False when the general results file cannot be created:
     // the session is then skipped. A Leq file, a band file or the filtered channel file

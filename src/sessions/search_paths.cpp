@@ -17,14 +17,18 @@ std::string comparablePath(const std::string& path) {
 
 AddPathResult addSearchPath(SearchPathList& list, const std::string& path, platform::Console& out) {
     try {
-        const std::string key = comparablePath(path);
-        for (const std::string& earlier : list.paths) {
-            if (comparablePath(earlier) == key) {
-                out.print("MSG: Duplicate Search Path Given - \"%s\".\r\n", path.c_str());
-                return AddPathResult::Duplicate;
-            }
+        std::string key = comparablePath(path);
+        if (list.comparable.contains(key)) {
+            out.print("MSG: Duplicate Search Path Given - \"%s\".\r\n", path.c_str());
+            return AddPathResult::Duplicate;
         }
         list.paths.push_back(path);
+        try {
+            list.comparable.insert(std::move(key));
+        } catch (const std::bad_alloc&) {
+            list.paths.pop_back();
+            throw;
+        }
         return AddPathResult::Added;
     } catch (const std::bad_alloc&) {
         out.print("ERROR - Unable to add %s\r\n", path.c_str());

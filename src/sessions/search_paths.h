@@ -2,6 +2,7 @@
 #pragma once
 
 #include <string>
+#include <unordered_set>
 #include <vector>
 
 #include "platform/console.h"
@@ -10,6 +11,13 @@ namespace orv {
 
 struct SearchPathList {
     std::vector<std::string> paths;
+    // The comparable form of every entry, computed once when it was added.
+    std::unordered_set<std::string> comparable{};
+
+    void clear() {
+        paths = {};
+        comparable = {};
+    }
 };
 
 enum class AddPathResult { Added, Duplicate, Failed };

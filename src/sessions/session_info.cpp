@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <vector>
 
+#include "input/input_file.h"
 #include "platform/directory.h"
 #include "platform/error_text.h"
 #include "platform/files.h"
@@ -163,18 +164,24 @@ std::string copyLineValue(std::string_view line) {
     return std::string(line.substr(colon + 2));
 }
 
-bool parseSessionInfoText(std::string_view text, SessionRecord& record) {
+bool parseSessionInfoText(std::string_view text, SessionRecord& record, std::size_t* firstBadLine) {
     InfoReadState state;
-    std::size_t pos = 0;
-    while (pos < text.size()) {
-        std::size_t length = std::min(kInfoLinePiece, text.size() - pos);
-        const std::size_t lf = text.find('\n', pos);
-        if (lf != std::string_view::npos && lf - pos + 1 < length) length = lf - pos + 1;
+    std::size_t lineNumber = 1;
+    std::size_t lf = text.find('\n');  // the end of the current line; searched once per line
+    for (std::size_t pos = 0; pos < text.size();) {
+        const std::size_t lineEnd = lf == std::string_view::npos ? text.size() : lf + 1;
+        const std::size_t length = std::min(kInfoLinePiece, lineEnd - pos);
         std::string_view line = text.substr(pos, length);
         pos += length;
         // A NUL byte ends the text of its line, as it ends a C string.
         line = line.substr(0, line.find('\0'));
+        const bool wasTooLong = state.keyTooLong;
         handleLine(line, record, state);
+        if (!wasTooLong && state.keyTooLong && firstBadLine != nullptr) *firstBadLine = lineNumber;
+        if (pos == lineEnd && lf != std::string_view::npos) {
+            ++lineNumber;
+            lf = text.find('\n', pos);
+        }
     }
     return !state.keyTooLong;
 }
@@ -185,13 +192,24 @@ bool readSessionInfoFile(SessionRecord& record, platform::Console& out) {
     const auto file = std::find_if(entries.begin(), entries.end(),
                                    [](const platform::DirEntry& e) { return !e.isDirectory; });
     if (file == entries.end()) return false;
+    const std::string path = platform::joinPath(record.sessionPath, file->name);
     std::string text;
     int error = 0;
-    if (!platform::readTextFile(platform::joinPath(record.sessionPath, file->name), text, &error)) {
-        out.print("Error opening session INF file - %s\r\n", platform::errorText(error).c_str());
+    const platform::ReadResult read = platform::readTextFile(path, text, kMaxInputFileSize, &error);
+    if (read != platform::ReadResult::Ok) {
+        if (!reportRefusedFile(read, path, out)) {
+            out.print("Error opening session INF file - %s\r\n",
+                      platform::errorText(error).c_str());
+        }
         return false;
     }
-    return parseSessionInfoText(text, record);
+    std::size_t badLine = 0;
+    if (!parseSessionInfoText(text, record, &badLine)) {
+        out.print("ERR: %s line %zu: key longer than %zu characters - session not added\r\n",
+                  path.c_str(), badLine, kMaxInfoKeyLength);
+        return false;
+    }
+    return true;
 }
 
 }  // namespace orv

@@ -19,13 +19,16 @@ inline constexpr std::size_t kMaxInfoKeyLength = 49;
 
 // Reads the first *.inf file (in name order) of record.sessionPath into the record's
 // fields. False when there is no such file, it cannot be read ("Error opening session INF
-// file - %s" is printed then), or a key was too long; in the last case the fields are still
-// filled from the whole file.
+// file - %s" is printed then, or the message for a file that is not a regular file or too
+// large), or a key was too long (a message names the file and the line); in the last case
+// the fields are still filled from the whole file.
 bool readSessionInfoFile(SessionRecord& record, platform::Console& out);
 
-// The line rules over the text of an information file (line ends already LF). False when a
-// key was too long.
-bool parseSessionInfoText(std::string_view text, SessionRecord& record);
+// The line rules over the text of an information file (line ends already LF), in time
+// linear in its length. False when a key was too long; `firstBadLine` then receives the
+// number (from 1) of the first line whose key was too long.
+bool parseSessionInfoText(std::string_view text, SessionRecord& record,
+                          std::size_t* firstBadLine = nullptr);
 
 // Day, month, year, hour, minute and second from the first run of digits of the line on,
 // each number followed by exactly one separator character of any kind. Day of week and

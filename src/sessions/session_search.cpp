@@ -109,7 +109,12 @@ bool addSession(SessionSearch& search, const std::string& name, bool isGivenPath
 
     SessionRecord candidate;
     candidate.sessionPath = buildSessionPath(name, isGivenPath, parentDir);
-    if (candidate.sessionPath.size() > SessionRecord::kMaxPathLength) return false;
+    if (candidate.sessionPath.size() > SessionRecord::kMaxPathLength) {
+        search.out.print(
+            "ERR: Session path %s is longer than %zu characters - session not added\r\n",
+            candidate.sessionPath.c_str(), SessionRecord::kMaxPathLength);
+        return false;
+    }
     if (!readSessionInfoFile(candidate, search.out)) return false;
     if (!listSessionFiles(candidate, "*.csv")) return false;
     sortFileList(candidate.dataFiles);

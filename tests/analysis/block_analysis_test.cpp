@@ -103,7 +103,8 @@ TEST_F(BlockAnalysis, FailuresAreReportedAndLeaveNoRows) {
     s.octaveTimeWeighting = SlmLibrary::TWeight::I;  // refused by the meter
     std::string printed;
     platform::Console console(&printed);
-    orv::BandResultsWriter writer(console);
+    orv::RunResults run(console);
+    orv::BandResultsWriter writer(run);
     orv::PendingIntervalMap pending(writer, nullptr);
     orv::AnalysisRunState state;
     state.filterErrorPause = std::chrono::milliseconds(0);

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <chrono>
+
 #include "config/settings.h"
 #include "platform/directory.h"
 #include "sessions/search_paths.h"
@@ -91,6 +93,14 @@ TEST_F(CommandLine, SearchPaths) {
     // Only duplicates still count as a given search path.
     p = parse({"-s", "/a", "-s", "/a", "-d", out()});
     EXPECT_EQ(p.ok, 1);
+    // Thousands of paths take time in proportion to their number (each is resolved once).
+    std::vector<std::string> many{"-s"};
+    for (int i = 0; i < 4000; ++i) many.push_back(dir_ / std::to_string(i % 3999));
+    many.insert(many.end(), {"-d", out()});
+    const auto start = std::chrono::steady_clock::now();
+    p = parse(many);
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
+    EXPECT_EQ(p.paths.paths.size(), 3999U);
 }
 
 TEST_F(CommandLine, Percentiles) {

@@ -88,7 +88,7 @@ TEST(StartUp, DefaultsAndTheirMessages) {
     ProcessingSettings s;
     s.octaveBandCount = 36;
     s.pipeName = "left over";
-    orv::SearchPathList paths{{"/x"}};
+    orv::SearchPathList paths{{"/x"}, {"/x"}};
     orv::SessionTable table;
     table.entries.resize(2);
     std::string out;
@@ -106,7 +106,7 @@ TEST(StartUp, DefaultsAndTheirMessages) {
     EXPECT_EQ(s.auxFilterType, 0U);
     EXPECT_EQ(s.pipeName, "");
     EXPECT_EQ(s.percentiles, (std::vector<float>{1, 5, 10, 25, 50, 75, 90, 99}));
-    EXPECT_TRUE(paths.paths.empty());
+    EXPECT_TRUE(paths.paths.empty() && paths.comparable.empty());
     EXPECT_EQ(table.count(), 0U);
 
     out.clear();

@@ -2,13 +2,20 @@
 
 #include <gtest/gtest.h>
 
+#include <sys/resource.h>
+#include <unistd.h>
+
 #include <cmath>
 #include <cstdio>
+#include <fstream>
 #include <memory>
 #include <random>
 
+#include "input/input_file.h"
+
 #include "sessions/session_info.h"
 #include "support/session_builder.h"
+#include "support/test_support.h"
 
 namespace {
 
@@ -54,7 +61,7 @@ TEST(LevelFileHeader, ReadsTheSixLines) {
     // Texts longer than their buffers keep 99 and 25 characters.
     std::string text = kHeader;
     text.replace(text.find("  Park Road"), 11, std::string(150, 't'));
-    text.replace(text.find("SN123"), 5, std::string(25, 's') + "\r");
+    text.replace(text.find("SN123"), 5, std::string(30, 's'));
     ASSERT_TRUE(parseHeader(text + "x", h, first));
     EXPECT_EQ(h.sessionTitle + "|" + h.serialNumber,
               std::string(99, 't') + "|" + std::string(25, 's'));
@@ -102,17 +109,38 @@ TEST(LevelRecords, FieldsAndConditions) {
     EXPECT_EQ(e.splA + e.splC + e.leqA + e.leqC + e.battery, 0.0F);
 }
 
-TEST(LevelRecords, DecodingStopsAtTheFirstMalformedRecord) {
+// A malformed line is left out on its own; the report names the first and counts them all.
+TEST(LevelRecords, MalformedLinesAreLeftOutOneByOne) {
     const std::string cases[] = {
-        "1:2.3,50.0;60.0,50.0,60.0,0,12.0\r\n",  "1:2.3,50.0,60.0,50.0,60.0,0,12.0",
-        "1:2.3,50.0,60.0,50.0,60.0,0,12.",       "1:2.3,50.0,60.0,50.0,60.0,0,12.0;\r\n",
-        "-1:2.3,50.0,60.0,50.0,60.0,0,12.0\r\n", "1-:2.3,50.0,60.0,50.0,60.0,0,12.0\r\n",
-        "1:2.-3,50.0,60.0,50.0,60.0,0,12.0\r\n", "1:2.3,50-,60.0,50.0,60.0,0,12.0\r\n",
-        "1:2.3,50.0,60.0,50.0,60.0,-2,12.0\r\n", "1:2.3,50.0,60.0,50.0,60.0,0,12-\r\n",
-        "1:2,3,50.0,60.0,50.0,60.0,0,12.0\r\n",
+        "1:2.3,50.0;60.0,50.0,60.0,0,12.0",
+        "1:2.3,50.0,60.0,50.0,60.0,0,12.0;",
+        "-1:2.3,50.0,60.0,50.0,60.0,0,12.0",
+        "1-:2.3,50.0,60.0,50.0,60.0,0,12.0",
+        "1:2.-3,50.0,60.0,50.0,60.0,0,12.0",
+        "1:2.3,50-,60.0,50.0,60.0,0,12.0",
+        "1:2.3,50.0,60.0,50.0,60.0,-2,12.0",
+        "1:2.3,50.0,60.0,50.0,60.0,0,12-",
+        "1:2,3,50.0,60.0,50.0,60.0,0,12.0",
+        "1:2.3,50.0,60.0,250.1,60.0,0,12.0",
+        "65536:2.3,50.0,60.0,50.0,60.0,0,12.0",
+        "1:2.3,50.0,60.0,50.0,60.0,4294967299,12.0",
+        "1:2.3,50.0,60.0,50.0,60.0,0," + std::string(40, '9'),
+        std::string("1:2.3,50.0\0,60.0,50.0,60.0,0,12.0", 34),
     };
-    for (const std::string& bad : cases)
-        EXPECT_EQ(decode(kRecord + bad + kRecord).size(), 1U) << bad;
+    for (const std::string& bad : cases) {
+        for (const char* end : {"\r\n", "\n", "\r"}) {
+            LevelRecordQueue q;
+            const std::string text = kRecord + bad + end + "\r\n" + bad + end + kRecord;
+            const auto data = std::make_unique<char[]>(text.size());
+            std::copy(text.begin(), text.end(), data.get());
+            const orv::DecodeReport report = orv::decodeLevelRecords(data.get(), text.size(), q);
+            EXPECT_EQ(q.size(), 2U) << bad;
+            EXPECT_EQ(report.firstBadLine * 10 + report.badLines, 22U) << bad;  // lines 2 and 4
+        }
+    }
+    // A last line without its line end is cut short; a lone line end is an empty line.
+    LevelRecordQueue q;
+    EXPECT_EQ(orv::decodeLevelRecords(kRecord.data(), kRecord.size() - 2, q).badLines, 1U);
     EXPECT_EQ(decode(kRecord + "\r").size(), 1U);
     EXPECT_EQ(decode("\n").size(), 0U);
 }
@@ -151,6 +179,37 @@ TEST(LevelRecords, RoundTripOfAnHourInTheLoggersLayout) {
     EXPECT_EQ(q.size(), 1U);
     EXPECT_EQ(q.records.capacity(), capacity);
 }
+
+#if !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)  // they reserve the space
+// A file whose bytes do not fit in memory is skipped with a message; the next one is read.
+TEST(LevelFile, AllocationFailureSkipsOnlyThatFile) {
+    testing_support::TempDir dir;
+    const std::string big = dir / "big.csv";
+    testing_support::writeFile(big, "");
+    ASSERT_EQ(::truncate(big.c_str(), 60 << 20), 0);
+    testing_support::writeFile(dir / "small.csv", kHeader + kRecord);
+    std::string text;
+    platform::Console out(&text);
+    std::vector<char> bytes;
+    DataFileHeader header;
+    LevelRecordQueue q;
+    rlimit saved{};
+    ASSERT_EQ(::getrlimit(RLIMIT_AS, &saved), 0);
+    std::ifstream statm("/proc/self/statm");
+    std::size_t pages = 0;
+    statm >> pages;
+    rlimit limit = saved;
+    limit.rlim_cur = pages * static_cast<std::size_t>(::sysconf(_SC_PAGESIZE)) + (16 << 20);
+    ASSERT_EQ(::setrlimit(RLIMIT_AS, &limit), 0);
+    const orv::LevelFileLoad load = orv::loadLevelDataFile(big, bytes, header, q, out);
+    ::setrlimit(RLIMIT_AS, &saved);
+    EXPECT_EQ(load, orv::LevelFileLoad::Skipped);
+    EXPECT_EQ(text, "ERR: Not enough memory to read " + big + " - skipped\r\n");
+    EXPECT_EQ(orv::loadLevelDataFile(dir / "small.csv", bytes, header, q, out),
+              orv::LevelFileLoad::Loaded);
+    EXPECT_EQ(q.size(), 1U);
+}
+#endif
 
 // Mutated text must never make the readers look outside it.
 TEST(RobustReaders, MutatedInputStaysInBounds) {

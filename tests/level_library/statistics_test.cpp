@@ -77,6 +77,15 @@ TEST(LevelDistribution, LnIsTheClassReachedOrExceededByNPercent) {
     EXPECT_FLOAT_EQ(narrow.maximum(), 150.25F);
     EXPECT_FLOAT_EQ(narrow.minimum(), -5.0F);
     EXPECT_FLOAT_EQ(narrow.exceedanceLevel(1.0), 100.0F);
+    // Any float lands in an end class, however far out (no integer holds its tenths).
+    constexpr float kInf = std::numeric_limits<float>::infinity();
+    for (const float far : {1e20F, 3e38F, kInf, -1e20F, -kInf, std::nanf("")}) {
+        LevelHistogram two;
+        two.add(60.0F);
+        two.add(far);
+        EXPECT_FLOAT_EQ(two.exceedanceLevel(0.0), far > 0.0F ? 250.0F : 60.0F) << far;
+        EXPECT_FLOAT_EQ(two.exceedanceLevel(100.0), far > 0.0F ? 60.0F : -100.0F) << far;
+    }
 
     EXPECT_EQ(LevelHistogram().exceedanceLevel(50.0), 0.0F);
 }

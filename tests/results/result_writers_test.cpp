@@ -56,7 +56,8 @@ TEST(GeneralResults, HeaderBlockAndColumnLine) {
     TempDir dir;
     std::string console;
     platform::Console out(&console);
-    orv::GeneralResultsWriter writer(out);
+    orv::RunResults run(out);
+    orv::GeneralResultsWriter writer(run);
     ASSERT_TRUE(writer.open(dir / "S1.csv"));
     ASSERT_TRUE(writer.writeHeader(sampleInfo(), 2));
     writer.close();
@@ -67,7 +68,7 @@ TEST(GeneralResults, HeaderBlockAndColumnLine) {
             "\"L90\",\"L99\",\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r\n");
     EXPECT_EQ(console, "");
     EXPECT_EQ(orv::percentileLabels({33.3F, 66.7F, 0.5F}), "\"L33\",\"L66\",\"L0\",");
-    EXPECT_FALSE(orv::GeneralResultsWriter(out).writeHeader(sampleInfo(), 2));  // not open
+    EXPECT_FALSE(orv::GeneralResultsWriter(run).writeHeader(sampleInfo(), 2));  // not open
 }
 
 TEST(GeneralResults, Rows) {
@@ -100,7 +101,8 @@ TEST(GeneralResults, Rows) {
 
     std::string console;
     platform::Console out(&console);
-    EXPECT_TRUE(orv::GeneralResultsWriter(out).writeRow(r));  // closed: nothing, but no failure
+    orv::RunResults run(out);
+    EXPECT_TRUE(orv::GeneralResultsWriter(run).writeRow(r));  // closed: nothing, but no failure
 }
 
 const char* const kLeqAllPassLine7 = "\"Time Averaging\",\"\",\"\",\"\",\"125 ms\"\r\n";
@@ -117,7 +119,8 @@ TEST(LeqResults, HeadersOfBothFiles) {
     TempDir dir;
     std::string console;
     platform::Console out(&console);
-    orv::LeqResultsWriter writer(out);
+    orv::RunResults run(out);
+    orv::LeqResultsWriter writer(run);
     ASSERT_TRUE(writer.open(orv::LeqFileKind::AllPass, dir / "S1_LEQ.csv"));
     ASSERT_TRUE(writer.open(orv::LeqFileKind::Octave, dir / "S1_LEQ1OCT.csv"));
     ASSERT_TRUE(writer.formatHeader(orv::LeqFileKind::AllPass, sampleInfo(), 1));
@@ -158,7 +161,8 @@ TEST(LeqResults, RowsGoToTheFileTheirLevelCountSelects) {
     TempDir dir;
     std::string console;
     platform::Console out(&console);
-    orv::LeqResultsWriter writer(out);
+    orv::RunResults run(out);
+    orv::LeqResultsWriter writer(run);
     ASSERT_TRUE(writer.open(orv::LeqFileKind::AllPass, dir / "a.csv"));
     ASSERT_TRUE(writer.open(orv::LeqFileKind::Octave, dir / "o.csv"));
     row.errorsInInterval = 0;
@@ -178,7 +182,8 @@ TEST(LeqResults, RollsOverIntoNumberedPartsWithTheSameHeader) {
     TempDir dir;
     std::string console;
     platform::Console out(&console);
-    orv::LeqResultsWriter writer(out, 25);  // parts of 25 lines: 21 header lines + 4 rows
+    orv::RunResults run(out);
+    orv::LeqResultsWriter writer(run, 25);  // parts of 25 lines: 21 header lines + 4 rows
     ASSERT_TRUE(writer.open(orv::LeqFileKind::AllPass, dir / "S1_LEQ.csv"));
     ASSERT_TRUE(writer.formatHeader(orv::LeqFileKind::AllPass, sampleInfo(), 1));
     ASSERT_TRUE(writer.writeColumnHeader(orv::LeqFileKind::AllPass));
@@ -210,7 +215,8 @@ TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
     TempDir dir;
     std::string console;
     platform::Console out(&console);
-    orv::LeqResultsWriter writer(out, 121);  // 100 rows per part
+    orv::RunResults run(out);
+    orv::LeqResultsWriter writer(run, 121);  // 100 rows per part
     orv::ResultHeaderInfo info = sampleInfo();
     for (auto kind : {orv::LeqFileKind::AllPass, orv::LeqFileKind::Octave}) {
         ASSERT_TRUE(
@@ -271,11 +277,9 @@ TEST(ResultNames, FlatAndSubDirectoryLayouts) {
     s.auxFreq2 = 0.0F;
     s.auxFreqWeighting = 2;
     s.auxTimeWeighting = 0;
-    orv::SessionRecord session;
-    session.sessionName = "S1";
     const std::string o = s.outputDir;
 
-    const orv::ResultNaming flat(s, session, 2);
+    const orv::ResultNaming flat(s, "S1", 2);
     EXPECT_EQ(flat.general(), o + "S1.csv");
     EXPECT_EQ(flat.leq(orv::LeqFileKind::AllPass, 36), o + "S1_LEQ.csv");
     EXPECT_EQ(flat.leq(orv::LeqFileKind::Octave, 36), o + "S1_LEQ3OCT.csv");
@@ -285,7 +289,7 @@ TEST(ResultNames, FlatAndSubDirectoryLayouts) {
     EXPECT_EQ(flat.prepareSessionDirectory(), "");
 
     s.binMode = 1;
-    const orv::ResultNaming bin(s, session, 3);
+    const orv::ResultNaming bin(s, "S1", 3);
     const std::string d = o + "S1/";
     EXPECT_EQ(bin.prepareSessionDirectory(), d);
     EXPECT_TRUE(testing_support::exists(d));
@@ -296,28 +300,32 @@ TEST(ResultNames, FlatAndSubDirectoryLayouts) {
     EXPECT_EQ(bin.filtered(), d + "LPF-1000-0_C_60_N.csv");
     s.statsIntervalMin = 15;
     s.leqInterval = 4;
-    EXPECT_EQ(orv::ResultNaming(s, session, 2).general(), d + "GEN_A_15_F.csv");
-    EXPECT_EQ(orv::ResultNaming(s, session, 2).leq(orv::LeqFileKind::AllPass, 0),
-              d + "LEQ_A_4_F.csv");
+    EXPECT_EQ(orv::ResultNaming(s, "S1", 2).general(), d + "GEN_A_15_F.csv");
+    EXPECT_EQ(orv::ResultNaming(s, "S1", 2).leq(orv::LeqFileKind::AllPass, 0), d + "LEQ_A_4_F.csv");
 }
 
 TEST(ResultFiles, ReplacedNotAppendedAndFailuresReported) {
     TempDir dir;
     std::string console;
     platform::Console out(&console);
+    orv::RunResults run(out);
     testing_support::writeFile(dir / "S1.csv", "an older and much longer result file\r\n");
     {
-        platform::File f = orv::createResultFile(dir / "S1.csv", out);
-        ASSERT_TRUE(f.valid());
-        f.write(std::string("new"));
+        orv::ResultFile f;
+        ASSERT_TRUE(f.create(dir / "S1.csv", run));
+        EXPECT_TRUE(f.write("new"));
     }
     EXPECT_EQ(readFile(dir / "S1.csv"), "new");
+    EXPECT_FALSE(run.lost());
 
-    EXPECT_FALSE(orv::createResultFile(dir / "missing/S1.csv", out).valid());
+    orv::ResultFile f;
+    EXPECT_FALSE(f.create(dir / "missing/S1.csv", run));
+    EXPECT_FALSE(f.write("row"));  // nothing more to report
     EXPECT_EQ(console, "Unable to open " + dir / "missing/S1.csv" + " : 2\r\n");
+    EXPECT_TRUE(run.lost());
     console.clear();
     const std::string longName = dir / std::string(260, 'x') + ".csv";
-    EXPECT_FALSE(orv::createResultFile(longName, out).valid());
+    EXPECT_FALSE(f.create(longName, run));
     EXPECT_EQ(console, "Unable to open " + longName + " : 36\r\n");
 }
 

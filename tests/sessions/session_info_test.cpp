@@ -4,6 +4,8 @@
 
 #include <unistd.h>
 
+#include <chrono>
+
 #include "sessions/decimal_number.h"
 #include "support/test_support.h"
 
@@ -80,6 +82,15 @@ TEST(InfoFile, LineShapes) {
               2000U);
     EXPECT_EQ(parse("SESSION NAME: " + std::string(300, 'x') + "\n", false).sessionName,
               std::string(79, 'x'));
+    // A file that ends in one very long line is read in time linear in its length.
+    const auto start = std::chrono::steady_clock::now();
+    std::size_t badLine = 0;
+    SessionRecord record;
+    std::string text = "TWEIGHT: 1\n\n";
+    text.append(8 << 20, 'x');
+    EXPECT_FALSE(orv::parseSessionInfoText(text, record, &badLine));
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(500));
+    EXPECT_EQ(badLine, 3U);
 }
 
 TEST(InfoFile, ReadsFirstInfFileOfTheSessionDirectory) {

@@ -94,7 +94,9 @@ TEST_F(SearchTest, CandidatesThatAreNotSessions) {
     const std::string parent = std::string(246 - root.size(), 'd');
     session(parent + "/longsession");
     session(parent + "/longsessio");
-    EXPECT_EQ(search({root, root + "/" + parent}, false, true), added("longsessio"));
+    EXPECT_EQ(search({root, root + "/" + parent}, false, true),
+              added("longsessio") + "ERR: Session path " + root + "/" + parent +
+                  "/longsession/ is longer than 259 characters - session not added\r\n");
 }
 
 // As with data.000, a session's files may be in any of its data directories.

@@ -480,7 +480,9 @@ std::optional<ResultFile> classifyPath(const std::string& path, std::vector<Prob
 bool readRowsFromDisk(ResultFile& file, std::vector<Problem>& problems) {
     std::vector<char> bytes;
     int error = 0;
-    if (!platform::readWholeFile(file.path, bytes, &error)) {
+    // A Leq part holds at most 2^20 lines; 4 GiB is far above any file orv_cmd writes.
+    constexpr std::uint64_t kLargest = 4ULL << 30;
+    if (platform::readRegularFile(file.path, bytes, kLargest, &error) != platform::ReadResult::Ok) {
         problems.push_back({file.path, 0, "cannot be read (error " + std::to_string(error) + ")"});
         return false;
     }

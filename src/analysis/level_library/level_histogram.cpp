@@ -11,9 +11,11 @@ LevelHistogram::LevelHistogram(float minDb, float maxDb)
 
 std::size_t LevelHistogram::classOf(float db) const {
     // Levels written with one decimal land exactly on their own class.
+    // Clamped before the conversion: a float far out of range (or infinite) has no integer.
     const double tenths = std::nearbyint(static_cast<double>(db) * 10.0) - firstClass_;
     if (!(tenths > 0.0)) return 0;  // also NaN
-    return std::min(static_cast<std::size_t>(tenths), counts_.size() - 1);
+    const auto top = static_cast<double>(counts_.size() - 1);
+    return tenths >= top ? counts_.size() - 1 : static_cast<std::size_t>(tenths);
 }
 
 float LevelHistogram::levelOfClass(std::size_t index) const {
