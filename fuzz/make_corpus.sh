@@ -56,3 +56,26 @@ args demo -s demo/demo-session -d demo/results -leq 1 -i 1
 args octave -s a b a -d out -oct 3 Z S -w C -p 90 10 50 -r
 args filters -S x -D out -lpf 1000 A F -bpf 100 1000 C S -apf C N -trg c -npn front -bin -csv
 args refused -s x -i -d out -leq 7 -p 10 abc -hpf 999 C S -d again
+
+# Wave files: a name length byte, the name, then the file (short recordings, one with a LIST
+# chunk, one continuation part, one whose data size disagrees with its length).
+mkdir -p "$corpus/wave_fuzz"
+python3 - "$corpus/wave_fuzz" <<'PY'
+import math, struct, sys
+def wave(samples, list_body=None, size_delta=0):
+    data = b''.join(struct.pack('<h', int(8000 * math.sin(i / 7.0))) for i in range(samples))
+    head = b'RIFF' + struct.pack('<I', 36 + len(data)) + b'WAVE'
+    if list_body is not None:
+        head += b'LIST' + struct.pack('<I', len(list_body)) + list_body
+    head += b'fmt ' + struct.pack('<IHHIIHH', 16, 1, 1, 48000, 96000, 2, 16)
+    return head + b'data' + struct.pack('<I', len(data) + size_delta) + data
+seeds = {
+    'plain': ('20200917_083000.wav', wave(14400)),
+    'list': ('20200917_083000.wav', wave(9600, list_body=b'INFOISFT' + bytes(12))),
+    'part': ('20200917_082958_001.wav', wave(14400)),
+    'mismatch': ('20200917_83000.wav', wave(4800, size_delta=1000)),
+}
+for key, (name, body) in seeds.items():
+    with open(f'{sys.argv[1]}/{key}', 'wb') as f:
+        f.write(bytes([len(name)]) + name.encode() + body)
+PY

@@ -5,7 +5,10 @@
 // Input: sections separated by "\n@@", each beginning with a tag byte. 'O': options (space
 // separated; -s, -d, -r and -npn are left out, the run adds its own -s and -d); 'I': the
 // information file of a new session; 'L' / 'M': a level data file of the current session in
-// data.000 / data.001. At most 4 sessions of at most 6 level files each.
+// data.000 / data.001; 'W': a wave file of the current session in data.000, its name's time
+// made of the section's first six bytes (each taken modulo 10 as a digit), the rest the file;
+// the first wave of a session starts a recording, the others are its continuation parts.
+// At most 4 sessions of at most 6 level files and 4 wave files each.
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
@@ -75,6 +78,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const std::string_view input(reinterpret_cast<const char*>(data), size);
     int sessions = 0;
     int files = 0;
+    int waves = 0;
     std::size_t written = 0;  // entries created below in/
     std::string session;
     for (std::size_t pos = 0; pos < input.size();) {
@@ -104,6 +108,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
                 fs::create_directories(session + "/data.001");
                 writeFile(session + "/session.inf", content);
                 files = 0;
+                waves = 0;
                 written += 4;
                 break;
             case 'L':
@@ -114,6 +119,20 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
                           content);
                 ++written;
                 break;
+            case 'W': {
+                if (session.empty() || waves == 4 || content.size() < 6) break;
+                std::string name = "/data.000/20240305_";
+                for (const char c : content.substr(0, 6)) {
+                    name.push_back(static_cast<char>('0' + static_cast<unsigned char>(c) % 10));
+                }
+                // The first starts a recording, the others are continuation parts.
+                if (waves > 0) name += "_" + std::to_string(waves);
+                name += ".wav";
+                ++waves;
+                writeFile(session + name, content.substr(6));
+                ++written;
+                break;
+            }
             default:
                 break;
         }
@@ -123,7 +142,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     for (const std::string& a : args) argv.push_back(a.c_str());
     std::string console;
     platform::Console out(&console);
-    const int status = orv::runOrvCmd(static_cast<int>(argv.size()), argv.data(), out, 0);
+    orv::RunEnvironment environment;
+    environment.filterErrorPause = std::chrono::milliseconds(0);
+    const int status = orv::runOrvCmd(static_cast<int>(argv.size()), argv.data(), out, environment);
     FUZZ_CHECK(status == orv::kExitOk || status == orv::kExitResultsLost ||
                status == orv::kExitRefused);
 

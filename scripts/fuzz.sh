@@ -9,7 +9,7 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 seconds=${1:-30}
 shift || true
-all=(info_file_fuzz level_data_fuzz command_line_fuzz session_run_fuzz)
+all=(info_file_fuzz level_data_fuzz command_line_fuzz session_run_fuzz wave_fuzz)
 targets=("${@:-${all[@]}}")
 
 probe=$(mktemp -d)

@@ -96,8 +96,11 @@ BlockFailure analyseBlock(const AudioBlock& block, const BandAnalysisSettings& s
     slm.setPercentiles(s.percentiles);
     slm.resetAll();
 
-    std::vector<std::int16_t> raw(kChunkSamples);
-    std::vector<float> x(kChunkSamples);
+    // Buffers for the longest piece: a chunk, or all of a shorter block or its pre-roll.
+    const auto longest = static_cast<std::size_t>(std::min<std::uint64_t>(
+        kChunkSamples, std::max(block.sampleCount(), block.preRoll.samples())));
+    std::vector<std::int16_t> raw(longest);
+    std::vector<float> x(longest);
     std::string failedFile;
     int code = 0;
 

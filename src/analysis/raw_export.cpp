@@ -10,7 +10,6 @@ namespace orv {
 namespace {
 
 constexpr std::size_t kPiecePeriods = 600;  // one minute
-constexpr std::size_t kPieceSamples = kPiecePeriods * kPeriodSamples;
 // A recording's start is primed with its first seconds played backwards.
 constexpr std::size_t kPrimeSamples = 2 * kWaveSampleRate;
 
@@ -32,11 +31,7 @@ RawLevelExport::RawLevelExport(float calibrationGain, float rangeMultiplier, Hou
       out_(out),
       weighting_(kWaveSampleRate),
       timeA_(SlmLibrary::TWeight::F, kWaveSampleRate, kWaveSampleRate),
-      timeC_(SlmLibrary::TWeight::F, kWaveSampleRate, kWaveSampleRate),
-      raw_(kPieceSamples),
-      x_(kPieceSamples),
-      a_(kPieceSamples),
-      c_(kPieceSamples) {}
+      timeC_(SlmLibrary::TWeight::F, kWaveSampleRate, kWaveSampleRate) {}
 
 // Starts the weightings as if the recording had been going on: its first seconds, played
 // backwards, run through the frequency weighting, and the time weightings start from their
@@ -68,6 +63,14 @@ void RawLevelExport::prime(const float* x, std::size_t n) {
 void RawLevelExport::onDispatch(const AudioBlock& block) {
     if (!block.continuesRecording) started_ = false;
     const std::size_t periods = block.periodCount();
+    // Buffers grow to the longest piece seen: a minute, or the longest shorter block.
+    const std::size_t longest = std::min(kPiecePeriods, periods) * kPeriodSamples;
+    if (raw_.size() < longest) {
+        raw_.resize(longest);
+        x_.resize(longest);
+        a_.resize(longest);
+        c_.resize(longest);
+    }
     for (std::size_t first = 0; first < periods; first += kPiecePeriods) {
         const std::size_t count = std::min(kPiecePeriods, periods - first);
         const std::size_t n = count * kPeriodSamples;

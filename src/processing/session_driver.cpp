@@ -68,8 +68,10 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     const BlockWorker worker(analysis, pending, analysisState_, out_);
     // The hourly raw levels, from every block before it is queued.
     HourlyRawFiles rawFiles(files.naming().directory(), analysisState_.rawFilesWritten, results_);
-    RawLevelExport rawExport(analysis.calibrationGain, analysis.rangeMultiplier, rawFiles, out_);
-    BlockObserver* observer = settings_.rawLevelCsv != 0 ? &rawExport : nullptr;
+    std::optional<RawLevelExport> rawExport;
+    if (settings_.rawLevelCsv != 0) {
+        rawExport.emplace(analysis.calibrationGain, analysis.rangeMultiplier, rawFiles, out_);
+    }
     std::optional<SessionAudio> audio;
     if (analyseBands || settings_.rawLevelCsv != 0) {
         SessionAudio::Options options;
@@ -79,7 +81,8 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
         options.preRollSeconds = analyseBands ? analysis.preRollSeconds() : 0;
         AudioDispatcher::Analysis analyse;
         if (analyseBands) analyse = [&worker](AudioBlock& block) { worker(block); };
-        audio.emplace(session, pool(), std::move(analyse), observer, options, out_);
+        audio.emplace(session, pool(), std::move(analyse), rawExport ? &*rawExport : nullptr,
+                      options, out_);
     }
 
     bool headersWritten = false;
@@ -118,7 +121,7 @@ void SessionProcessor::processSession(const SessionRecord& session, ProgressPipe
     // Nothing of the session outlives it: its blocks are analysed and written before its
     // files are closed.
     if (audio) audio->finish();
-    if (observer != nullptr) rawExport.finish();
+    if (rawExport) rawExport->finish();
     pending.flushAll();
     files.close();
 }

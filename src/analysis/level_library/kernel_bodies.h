@@ -13,7 +13,7 @@
 
 // N: state size (2 per section); Decimate: keep the odd outputs only.
 template <std::size_t N, bool Decimate>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& pl, double* state,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void iirRun(const IirBlockPlan& pl, double* state,
                                                             const float* in, std::size_t blocks,
                                                             float* out) {
     constexpr std::size_t kHalves = N > 4 ? 2 : 1;  // four-double parts of the state
@@ -96,7 +96,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& 
 
 // The same cascade sample by sample (transposed direct form II, the state of iirRun).
 template <std::size_t N, bool Decimate>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirSerial(const IirBlockPlan& pl,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void iirSerial(const IirBlockPlan& pl,
                                                                double* state, const float* in,
                                                                std::size_t blocks, float* out) {
     constexpr std::size_t K = N / 2;
@@ -160,7 +160,7 @@ struct LaneVec<double> {
 };
 
 template <typename T, std::size_t K>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, const T* uHigh,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void lanesRun(const T* uLow, const T* uHigh,
                                                               std::size_t n, float* out,
                                                               const T* coef, const T* gain,
                                                               const T* pick, T* state) {
@@ -234,7 +234,7 @@ ORV_LANES_ENTRY(lanesD4, double, 4)
 // (1 - z^-2)^Order of x (x[-8] .. x[-1] readable), in double, stored as T; eight outputs a
 // step.
 template <typename T, unsigned Order>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void zerosRun(const float* x, std::size_t n,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void zerosRun(const float* x, std::size_t n,
                                                               T* out) {
     constexpr double kCoef[5][5] = {
         {1, 0, 0, 0, 0}, {1, -1, 0, 0, 0}, {1, -2, 1, 0, 0}, {1, -3, 3, -1, 0}, {1, -4, 6, -4, 1}};
@@ -293,7 +293,7 @@ struct MagnitudeVec<2> {
 // Statistics of H four-lane halves (lanes 0 .. 4H-1 of frames eight floats apart): energy,
 // time weighting y = (1 - a) y + a p and its extremes, largest magnitude.
 template <std::size_t H>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* frames, std::size_t run,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void levelsRun(const float* frames, std::size_t run,
                                                                const LevelRun& r) {
     using M = typename MagnitudeVec<H>::V;  // the lanes' floats
     using Bits = typename MagnitudeVec<H>::Bits;

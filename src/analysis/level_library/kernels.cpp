@@ -72,9 +72,13 @@ constexpr bool kIirBlocks = true;
 #define ORV_KERNEL_TARGET __attribute__((target("avx2,fma"), optimize("fp-contract=fast")))
 #endif
 #define ORV_SELECT ORV_SELECT_VECTOR
+#if defined(__clang__)
+#define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
+#else
 #define ORV_BROADCAST(v, k)                                                        \
     __builtin_shuffle(v, V4l{static_cast<long long>(k), static_cast<long long>(k), \
                              static_cast<long long>(k), static_cast<long long>(k)})
+#endif
 #include "kernel_bodies.h"
 #undef ORV_KERNEL_TARGET
 #undef ORV_SELECT
