@@ -255,4 +255,22 @@ TEST_F(AudioRun, FileNamesAndHeadersInBothLayouts) {
     EXPECT_EQ(readFile(dir + "1OCT1kHz_A_1_F.csv"), readFile(out() + "/Hdr_1kHz.csv"));
 }
 
+TEST_F(AudioRun, AnUnusableWaveFileCostsOnlyItsOwnSession) {
+    const auto audio = toneSamples(1000.0, 1000.0, 61 * 48000);
+    addSession("Good", audio);
+    const std::vector<std::string> options{"-oct", "1", "Z", "F", "-i", "1", "-csv"};
+    ASSERT_EQ(run(out() + "clean", options).status, 0);
+    addSession("Bad", audio);  // processed first; its wave file is then made stereo
+    writeWaveFile(dir_ / "sessions/Bad/data.000/20200917_080000.wav", audio,
+                  WaveLayout{.channels = 2});
+    const RunResult r = run(out(), options);
+    ASSERT_EQ(r.status, 0);
+    EXPECT_NE(r.output.find("Raw Data Disabled - Error Opening PCM Data file\r\n"),
+              std::string::npos);
+    EXPECT_TRUE(resultRows(out() + "/Bad_1kHz.csv").empty());
+    for (const std::string& name : listNames(out() + "clean")) {
+        EXPECT_EQ(readFile(out() + "/" + name), readFile(out() + "clean/" + name)) << name;
+    }
+}
+
 }  // namespace
