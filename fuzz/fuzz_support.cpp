@@ -11,7 +11,7 @@ struct Scratch {
     // In memory where the system offers it: the targets create and delete files at every
     // input, which a disk file system makes several times slower.
     Scratch() {
-        for (const std::filesystem::path dir :
+        for (const std::filesystem::path& dir :
              {std::filesystem::path("/dev/shm"), std::filesystem::temp_directory_path()}) {
             std::string pattern = (dir / "orv_fuzz_XXXXXX").string();
             if (::mkdtemp(pattern.data()) != nullptr) {

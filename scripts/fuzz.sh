@@ -3,10 +3,17 @@
 # when missing), replays every input in fuzz/regressions/<target>/, then runs each target for
 # SECONDS (default 30) on its corpus in fuzz/corpus/<target>/, as many at once as there are
 # processors. New inputs go to build-fuzz/new/<target>/, failing ones to build-fuzz/artifacts/.
+# Everything in that tree is built with AddressSanitizer + UndefinedBehaviorSanitizer; with
+# --tests the whole test suite is built and run there first (one sanitizer build for both).
 #
-#   scripts/fuzz.sh [SECONDS [TARGET...]]
+#   scripts/fuzz.sh [--tests] [SECONDS [TARGET...]]
 set -euo pipefail
 cd "$(dirname "$0")/.."
+tests=OFF
+if [ "${1:-}" = "--tests" ]; then
+  tests=ON
+  shift
+fi
 seconds=${1:-30}
 shift || true
 all=(info_file_fuzz level_data_fuzz command_line_fuzz session_run_fuzz wave_fuzz)
@@ -32,7 +39,13 @@ fi
 
 ./scripts/deps.sh
 CC=clang CXX=clang++ cmake -S . -B build-fuzz -DCMAKE_BUILD_TYPE=RelWithDebInfo \
-    -DORV_BUILD_FUZZERS=ON -DORV_BUILD_TESTS=OFF -DORV_BUILD_BENCHMARKS=OFF >/dev/null
+    -DORV_BUILD_FUZZERS=ON -DORV_BUILD_TESTS=$tests -DORV_BUILD_BENCHMARKS=OFF >/dev/null
+if [ "$tests" = ON ]; then
+  cmake --build build-fuzz -j"$(nproc)" >build-fuzz/build.log 2>&1 ||
+      { grep -B2 -A8 'error' build-fuzz/build.log | head -80; exit 1; }
+  ASAN_OPTIONS=detect_leaks=1:abort_on_error=1 UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 \
+    ctest --test-dir build-fuzz -j"$(nproc)" --output-on-failure
+fi
 cmake --build build-fuzz -j"$(nproc)" --target "${targets[@]}" >build-fuzz/build.log 2>&1 ||
     { grep -B2 -A8 'error' build-fuzz/build.log | head -80; exit 1; }
 

@@ -6,6 +6,7 @@
 
 namespace platform {
 
-void appendFormatV(std::string& out, const char* format, va_list args);
+void appendFormatV(std::string& out, const char* format, va_list args)
+    __attribute__((format(printf, 2, 0)));
 
 }  // namespace platform

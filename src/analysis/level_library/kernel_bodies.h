@@ -245,7 +245,7 @@ template <typename T, unsigned Order>
         V4d acc = __builtin_convertvector(v, V4d);
 #pragma GCC unroll 4
         for (unsigned j = 1; j <= Order; ++j) {
-            __builtin_memcpy(&v, x + i - 2 * j, sizeof v);
+            __builtin_memcpy(&v, x - 2 * j + i, sizeof v);
             acc += kCoef[Order][j] * __builtin_convertvector(v, V4d);
         }
         if constexpr (sizeof(T) == sizeof(float)) {
@@ -258,7 +258,7 @@ template <typename T, unsigned Order>
     for (; i < n; ++i) {
         double acc = x[i];
         for (unsigned j = 1; j <= Order; ++j)
-            acc += kCoef[Order][j] * static_cast<double>(x[i - 2 * j]);
+            acc += kCoef[Order][j] * static_cast<double>((x - 2 * j)[i]);
         out[i] = static_cast<T>(acc);
     }
 }
