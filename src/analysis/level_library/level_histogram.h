@@ -14,6 +14,10 @@ public:
     explicit LevelHistogram(float minDb = -100.0F, float maxDb = 250.0F);
 
     void add(float db);
+    // The same as add(Dsp::powerToDb(power)) for the classes and the count, mostly without a
+    // logarithm. minimum() and maximum() are kept by add only: a histogram is fed by one of
+    // the two.
+    void addPower(double power);
     void reset();
 
     std::uint64_t count() const { return count_; }
