@@ -71,23 +71,75 @@ TEST(Kernels, GenericAndAvx2PathsAgree) {
         avx2->zerosF[k - 1](in, zb.size(), zb.data());
         expectClose(za, zb, "zeros ");
     }
-    // Statistics of eight and of four lanes.
-    for (auto levels : {&KernelTable::levels8, &KernelTable::levels4}) {
-        double e[2][8] = {}, y[2][8] = {}, mx[2][8], mn[2][8];
-        float mag[2][8] = {};
-        std::fill(&mx[0][0], &mx[0][0] + 16, -1.0);
-        std::fill(&mn[0][0], &mn[0][0] + 16, 1e9);
-        for (int t = 0; t < 2; ++t) {
-            const LevelRun run{e[t], y[t], mx[t], mn[t], mag[t], 0.01};
-            ((t == 0 ? gen : *avx2).*levels)(in, 64, run);
+}
+
+// Statistics computed by the lane filters on their way, on every path this processor has,
+// against the definition applied to the frames they wrote: four or eight lanes, float and
+// double; and the peak search.
+TEST(Kernels, LaneStatisticsAndPeakSearchFollowTheirDefinition) {
+    const std::vector<float> x = level_library_test::whiteNoise(8 * 64 + 8, 7);
+    const float* in = x.data() + 8;
+    std::vector<float> coef(2 * 8), gain(8, 0.5F), pick(8, 0.0F);
+    for (std::size_t l = 0; l < 8; ++l) {
+        coef[l] = static_cast<float>(-1.8 * std::cos(0.1 + 0.05 * static_cast<double>(l)));
+        coef[8 + l] = 0.81F;
+    }
+    const std::vector<double> coefD(coef.begin(), coef.end()), gainD(gain.begin(), gain.end()),
+        pickD(8, 0.0), xd(in, in + 300);
+    for (const KernelTable* table : {&genericKernels(), avx2Kernels()}) {
+        if (table == nullptr) continue;
+        for (int precision = 0; precision < 2; ++precision) {
+            for (unsigned lanes : {4U, 8U}) {
+                double e[8] = {}, y[8], mx[8], mn[8];
+                float mag[8] = {};
+                std::fill(y, y + 8, 0.5);
+                std::fill(mx, mx + 8, -1.0);
+                std::fill(mn, mn + 8, 1e9);
+                const double alpha = 0.01;
+                const LevelRun run{e, y, mx, mn, mag, alpha, lanes};
+                std::vector<float> frames(300 * 8);
+                std::vector<float> stateF(16, 0.0F);
+                std::vector<double> stateD(16, 0.0);
+                if (precision == 0) {
+                    table->lanesF[0](in, in, 300, frames.data(), coef.data(), gain.data(),
+                                     pick.data(), stateF.data());
+                } else {
+                    table->lanesD[0](xd.data(), xd.data(), 300, frames.data(), coefD.data(),
+                                     gainD.data(), pickD.data(), stateD.data());
+                }
+                table->levels(frames.data(), 300, run);
+                for (std::size_t l = 0; l < lanes; ++l) {
+                    double re = 0.0, ry = 0.5, rmax = -1.0, rmin = 1e9;
+                    float rmag = 0.0F;
+                    for (std::size_t i = 0; i < 300; ++i) {
+                        const double v = frames[i * 8 + l];
+                        re += v * v;
+                        ry = (1.0 - alpha) * ry + alpha * v * v;
+                        rmax = std::max(rmax, ry);
+                        rmin = std::min(rmin, ry);
+                        rmag = std::max(rmag, std::fabs(frames[i * 8 + l]));
+                    }
+                    SCOPED_TRACE(testing::Message() << table->name << " precision " << precision
+                                                    << " lanes " << lanes << " lane " << l);
+                    EXPECT_NEAR(e[l], re, 1e-12 * re);
+                    EXPECT_NEAR(y[l], ry, 1e-12 * re);
+                    EXPECT_NEAR(mx[l], rmax, 1e-12 * re);
+                    EXPECT_NEAR(mn[l], rmin, 1e-12 * re);
+                    EXPECT_EQ(mag[l], rmag);
+                }
+                for (std::size_t l = lanes; l < 8; ++l) EXPECT_EQ(e[l], 0.0) << "lane " << l;
+            }
         }
-        for (std::size_t l = 0; l < 8; ++l) {
-            EXPECT_NEAR(e[0][l], e[1][l], 1e-12 * e[1][l]);
-            EXPECT_NEAR(y[0][l], y[1][l], 1e-12 * e[1][l]);
-            EXPECT_NEAR(mx[0][l], mx[1][l], 1e-12 * e[1][l]);
-            EXPECT_NEAR(mn[0][l], mn[1][l], 1e-12 * e[1][l]);
-            EXPECT_EQ(mag[0][l], mag[1][l]);
-        }
+        // The peak search: the first frame where a lane reaches its threshold.
+        std::vector<float> frames(8 * 40, 0.1F);
+        const float threshold[8] = {1, 1, 1, 1, 1, 1, 1, 2};
+        frames[8 * 33 + 7] = -1.5F;  // below lane 7's threshold
+        EXPECT_EQ(table->crossing(frames.data(), 40, threshold), 40U) << table->name;
+        for (std::size_t at : {0U, 5U, 37U}) frames[8 * at + at % 7] = -1.0F;
+        EXPECT_EQ(table->crossing(frames.data(), 40, threshold), 0U) << table->name;
+        EXPECT_EQ(table->crossing(frames.data() + 8, 39, threshold), 4U) << table->name;
+        EXPECT_EQ(table->crossing(frames.data() + 8 * 6, 34, threshold), 31U) << table->name;
+        EXPECT_EQ(table->crossing(frames.data() + 8 * 38, 2, threshold), 2U) << table->name;
     }
 }
 

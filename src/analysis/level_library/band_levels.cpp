@@ -116,7 +116,7 @@ void BandLevels<W>::resetStatistics() {
 template <std::size_t W>
 void BandLevels<W>::tick() {
     for (std::size_t l = 0; l < W; ++l) {
-        if (active_[l] && primed_[l]) histogram_[l].add(Dsp::powerToDb(tw_[l]));
+        if (active_[l] && primed_[l]) histogram_[l].addPower(tw_[l]);
     }
 }
 
@@ -157,17 +157,15 @@ void BandLevels<W>::finishPriming(std::size_t l) {
 template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
-    const LevelRun run{energy_.data(), tw_.data(),       max_.data(),
-                       min_.data(),    magnitude.data(), alpha_};
     // Groups whose lanes 4..7 are unused need half the work.
-    auto* const kernel =
-        kernels().levels4 == nullptr || !lowHalfOnly_ ? kernels().levels8 : kernels().levels4;
+    const LevelRun run{energy_.data(),   tw_.data(), max_.data(),           min_.data(),
+                       magnitude.data(), alpha_,     lowHalfOnly_ ? 4U : 8U};
     std::size_t i = 0;
     while (i < count) {
         const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);
         const float* f = frames + i * W;
         if constexpr (W == 8) {
-            kernel(f, n, run);
+            kernels().levels(f, n, run);
         } else {
             const double a = alpha_;
             for (std::size_t k = 0; k < n; ++k) {
@@ -202,7 +200,7 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
     // Frames -8 .. -1 from the previous call (tail_), then this call's. A sample is
     // interpolated once four frames after it are known; the last four wait for the next call.
     const std::size_t total = kHistory + count;
-    const std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
+    std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
     const std::size_t end = total - 4;
     const QuarterKernels& k = quarterKernels();
     auto x = [&](std::size_t j, std::size_t l) {
@@ -217,28 +215,43 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
         threshold[l] = interpolate_[l] ? 0.7F * best[l] : std::numeric_limits<float>::infinity();
     }
     auto interpolateAround = [&](std::size_t j, std::size_t l) {
-        for (std::size_t base = j - 1; base <= j; ++base) {
+        float w[9];  // samples j - 4 .. j + 4
+        for (std::size_t i = 0; i < 9; ++i) w[i] = x(j - 4 + i, l);
+        for (std::size_t base = 0; base < 2; ++base) {  // around j - 1, then j
             for (int t = 0; t < 3; ++t) {
                 float s = 0.0F;
-                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x(base - 3 + i, l);
+                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * w[base + i];
                 best[l] = std::max(best[l], std::fabs(s));
             }
         }
-        best[l] = std::max(best[l], std::fabs(x(j, l)));
+        best[l] = std::max(best[l], std::fabs(w[4]));
         threshold[l] = 0.7F * best[l];
     };
     // Only lanes whose largest magnitude reaches the threshold need a look at the frames:
     // the call's own frames (measured by the statistics kernel) and the ones waiting from
-    // the previous call.
+    // the previous call. Each lane sees its frames in order, the threshold rising as crests
+    // are found.
     std::array<float, W> largest = magnitude;
     for (std::size_t j = begin; j < kHistory; ++j) {
         for (std::size_t l = 0; l < W; ++l) largest[l] = std::max(largest[l], std::fabs(x(j, l)));
     }
-    for (std::size_t l = 0; l < W; ++l) {
-        if (!interpolate_[l] || largest[l] < threshold[l]) continue;
-        for (std::size_t j = begin; j < end; ++j) {
+    bool any = false;
+    for (std::size_t l = 0; l < W; ++l)
+        any = any || (interpolate_[l] && largest[l] >= threshold[l]);
+    if (!any) begin = end;
+    auto visit = [&](std::size_t j) {
+        for (std::size_t l = 0; l < W; ++l) {
             if (std::fabs(x(j, l)) >= threshold[l]) interpolateAround(j, l);
         }
+    };
+    std::size_t j = begin;
+    for (; j < std::min(end, kHistory); ++j) visit(j);
+    while (j < end) {
+        if constexpr (W == 8) {
+            j += kernels().crossing(frames + (j - kHistory) * W, end - j, threshold.data());
+            if (j == end) break;
+        }
+        visit(j++);
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (interpolate_[l]) truePeak_[l] = best[l];
@@ -295,7 +308,7 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
                         max_[l] = std::max(max_[l], level);
                         min_[l] = std::min(min_[l], level);
                         hasExtremes_[l] = true;
-                        histogram_[l].add(Dsp::powerToDb(level));
+                        histogram_[l].addPower(level);
                     }
                     periodSum_[l] = 0.0;
                 }

@@ -7,9 +7,11 @@
 // instruction, or two SSE instructions on the generic path.
 
 // No helper takes or returns a vector by value: without AVX that would change the calling
-// convention of the generic copy (GCC warns). Selects and broadcasts are the macros
-// ORV_SELECT(out, mask, a, b) and ORV_BROADCAST(v, k) of kernels.cpp, written for each
-// instruction set (a plain vector ?: would become scalar code on two-register vectors).
+// convention of the generic copy (GCC warns). Selects, broadcasts and conversions between
+// four floats and four doubles are the macros ORV_SELECT(out, mask, a, b), ORV_BROADCAST(v,
+// k), ORV_WIDEN(out, v) and ORV_NARROW(out, v) of kernels.cpp, written for each instruction
+// set (a plain vector ?: would become scalar code on two-register vectors, and a generic
+// conversion becomes two half conversions through memory in the AVX copy).
 
 // N: state size (2 per section); Decimate: keep the odd outputs only.
 template <std::size_t N, bool Decimate>
@@ -86,7 +88,8 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& 
             s[h] = (next[h][0] + next[h][1]) + (next[h][2] + next[h][3]);
 #pragma GCC unroll 16
         for (std::size_t h = 0; h < kOut; ++h) {
-            const V4f f = __builtin_convertvector(y[h][0] + y[h][1], V4f);
+            V4f f;
+            ORV_NARROW(f, y[h][0] + y[h][1]);
             __builtin_memcpy(out + b * (Decimate ? 4 : 8) + h * 4, &f, sizeof f);
         }
     }
@@ -151,13 +154,138 @@ struct LaneVec;
 template <>
 struct LaneVec<float> {
     using V = V8f;
+    using Mask = V8i;
     static constexpr std::size_t kParts = 1;
 };
 template <>
 struct LaneVec<double> {
     using V = V4d;
+    using Mask = V4l;
     static constexpr std::size_t kParts = 2;
 };
+
+// Statistics of H four-lane halves of n eight-float frames (lanes 0 .. 4H - 1): energy,
+// time weighting y = (1 - a) y + a p and its extremes, largest magnitude (all eight lanes).
+//
+// Eight frames at a time: y after the block is (1 - a)^8 y + sum_j a (1 - a)^(7 - j) p_j,
+// independent sums instead of a chain of eight dependent steps. Within the block y stays
+// between (1 - a)^8 y and y + a sum_j p_j (p >= 0); only when that range reaches beyond the
+// extremes so far are the block's levels computed one by one to update them.
+// Squares of lanes 4h .. 4h + 3 of the frame at f.
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void squares(const float* f, std::size_t h,
+                                                             V4d& p) {
+    V4f part;
+    __builtin_memcpy(&part, f + 4 * h, sizeof part);
+    V4d d;
+    ORV_WIDEN(d, part);
+    p = d * d;
+}
+
+// mag = max(mag, |frame at f|).
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void largest(const float* f, V8f& mag) {
+    V8i bits;
+    __builtin_memcpy(&bits, f, sizeof bits);
+    bits &= V8i{} + 0x7fffffff;
+    V8f av;
+    __builtin_memcpy(&av, &bits, sizeof av);
+    ORV_MAX_F(mag, av);
+}
+
+// One frame's time weighting the direct way, and its extremes; p receives the squares.
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void weigh(const float* f, std::size_t h,
+                                                           const V4d& a, const V4d& keep, V4d& y,
+                                                           V4d& mx, V4d& mn, V4d& p) {
+    squares(f, h, p);
+    const V4d ap = a * p;
+    y = keep * y + ap;
+    ORV_MAX_D(mx, y);
+    ORV_MIN_D(mn, y);
+}
+
+template <std::size_t H>
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* frames, std::size_t n,
+                                                               const LevelRun& r) {
+    V4d e[H], y[H], mx[H], mn[H];
+    V8f mag;
+#pragma GCC unroll 2
+    for (std::size_t h = 0; h < H; ++h) {
+        __builtin_memcpy(&e[h], r.energy + 4 * h, sizeof(V4d));
+        __builtin_memcpy(&y[h], r.tw + 4 * h, sizeof(V4d));
+        __builtin_memcpy(&mx[h], r.maxima + 4 * h, sizeof(V4d));
+        __builtin_memcpy(&mn[h], r.minima + 4 * h, sizeof(V4d));
+    }
+    __builtin_memcpy(&mag, r.magnitude, sizeof mag);
+    const V4d a = r.alpha - V4d{};
+    const V4d keep = (1.0 - r.alpha) - V4d{};
+    double c[8];  // c[j] = a (1 - a)^(7 - j)
+    double decay = 1.0;
+    for (std::size_t j = 8; j-- > 0;) {
+        c[j] = r.alpha * decay;
+        decay *= 1.0 - r.alpha;
+    }
+    const V4d keep8 = decay - V4d{};
+    std::size_t i = 0;
+    for (; i + 8 <= n; i += 8) {
+        const float* f = frames + i * 8;
+        V4d sum[H][2] = {}, acc[H][2] = {};
+#pragma GCC unroll 8
+        for (std::size_t j = 0; j < 8; ++j) {
+            largest(f + j * 8, mag);
+#pragma GCC unroll 2
+            for (std::size_t h = 0; h < H; ++h) {
+                V4d p;
+                squares(f + j * 8, h, p);
+                sum[h][j % 2] += p;
+                acc[h][j % 2] += c[j] * p;
+            }
+        }
+        V4l outside = {};
+#pragma GCC unroll 2
+        for (std::size_t h = 0; h < H; ++h) {
+            const V4d total = sum[h][0] + sum[h][1];
+            e[h] += total;
+            // NaN counts as outside: the direct way then carries it into the extremes.
+            outside |= ~(y[h] + a * total <= mx[h]) | ~(keep8 * y[h] >= mn[h]);
+        }
+        if (outside[0] != 0 || outside[1] != 0 || outside[2] != 0 || outside[3] != 0) {
+#pragma GCC unroll 2
+            for (std::size_t h = 0; h < H; ++h) {
+                for (std::size_t j = 0; j < 8; ++j) {
+                    V4d p;
+                    weigh(f + j * 8, h, a, keep, y[h], mx[h], mn[h], p);
+                }
+            }
+        } else {
+#pragma GCC unroll 2
+            for (std::size_t h = 0; h < H; ++h) y[h] = keep8 * y[h] + (acc[h][0] + acc[h][1]);
+        }
+    }
+    for (; i < n; ++i) {
+        largest(frames + i * 8, mag);
+#pragma GCC unroll 2
+        for (std::size_t h = 0; h < H; ++h) {
+            V4d p;
+            weigh(frames + i * 8, h, a, keep, y[h], mx[h], mn[h], p);
+            e[h] += p;
+        }
+    }
+#pragma GCC unroll 2
+    for (std::size_t h = 0; h < H; ++h) {
+        __builtin_memcpy(r.energy + 4 * h, &e[h], sizeof(V4d));
+        __builtin_memcpy(r.tw + 4 * h, &y[h], sizeof(V4d));
+        __builtin_memcpy(r.maxima + 4 * h, &mx[h], sizeof(V4d));
+        __builtin_memcpy(r.minima + 4 * h, &mn[h], sizeof(V4d));
+    }
+    __builtin_memcpy(r.magnitude, &mag, 4 * H * sizeof(float));
+}
+
+ORV_KERNEL_TARGET void levels(const float* frames, std::size_t n, const LevelRun& r) {
+    if (r.lanes <= 4) {
+        levelsRun<1>(frames, n, r);
+    } else {
+        levelsRun<2>(frames, n, r);
+    }
+}
 
 template <typename T, std::size_t K>
 ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, const T* uHigh,
@@ -165,9 +293,11 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
                                                               const T* coef, const T* gain,
                                                               const T* pick, T* state) {
     using V = typename LaneVec<T>::V;
+    using Mask = typename LaneVec<T>::Mask;
     constexpr std::size_t P = LaneVec<T>::kParts;
     constexpr std::size_t L = 8 / P;  // lanes per part
-    V a1[K][P], a2[K][P], w1[K][P], w2[K][P], g[P], sel[P];
+    V a1[K][P], a2[K][P], w1[K][P], w2[K][P], g[P];
+    Mask high[P];
 #pragma GCC unroll 16
     for (std::size_t p = 0; p < P; ++p) {
 #pragma GCC unroll 16
@@ -178,7 +308,9 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
             __builtin_memcpy(&w2[k][p], state + (2 * k + 1) * 8 + p * L, sizeof(V));
         }
         __builtin_memcpy(&g[p], gain + p * L, sizeof(V));
-        __builtin_memcpy(&sel[p], pick + p * L, sizeof(V));
+        V sel;
+        __builtin_memcpy(&sel, pick + p * L, sizeof(V));
+        high[p] = sel != 0;
     }
     const bool mixed = uLow != uHigh;
     for (std::size_t i = 0; i < n; ++i) {
@@ -187,7 +319,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
 #pragma GCC unroll 16
         for (std::size_t p = 0; p < P; ++p) {
             V x = lo;
-            if (mixed) ORV_SELECT(x, sel[p] != 0, hi, lo);
+            if (mixed) ORV_SELECT(x, high[p], hi, lo);
 #pragma GCC unroll 16
             for (std::size_t k = 0; k < K; ++k) {
                 // w[n-2] first: the recursion through w[n-1] is a single multiply-add.
@@ -201,7 +333,8 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
             if constexpr (P == 1) {
                 __builtin_memcpy(out + i * 8, &x, sizeof x);
             } else {
-                const V4f f = __builtin_convertvector(x, V4f);
+                V4f f;
+                ORV_NARROW(f, x);
                 __builtin_memcpy(out + i * 8 + p * L, &f, sizeof f);
             }
         }
@@ -242,14 +375,18 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void zerosRun(const float* x, st
     for (; i + 4 <= n; i += 4) {
         V4f v;
         __builtin_memcpy(&v, x + i, sizeof v);
-        V4d acc = __builtin_convertvector(v, V4d);
+        V4d acc;
+        ORV_WIDEN(acc, v);
 #pragma GCC unroll 4
         for (unsigned j = 1; j <= Order; ++j) {
             __builtin_memcpy(&v, x + i - 2 * j, sizeof v);
-            acc += kCoef[Order][j] * __builtin_convertvector(v, V4d);
+            V4d w;
+            ORV_WIDEN(w, v);
+            acc += kCoef[Order][j] * w;
         }
         if constexpr (sizeof(T) == sizeof(float)) {
-            const V4f f = __builtin_convertvector(acc, V4f);
+            V4f f;
+            ORV_NARROW(f, acc);
             __builtin_memcpy(out + i, &f, sizeof f);
         } else {
             __builtin_memcpy(out + i, &acc, sizeof acc);
@@ -277,73 +414,32 @@ ORV_ZEROS_ENTRY(zerosD3, double, 3)
 ORV_ZEROS_ENTRY(zerosD4, double, 4)
 #undef ORV_ZEROS_ENTRY
 
-template <std::size_t H>
-struct MagnitudeVec;
-template <>
-struct MagnitudeVec<1> {
-    using V = V4f;
-    using Bits = V4i;
-};
-template <>
-struct MagnitudeVec<2> {
-    using V = V8f;
-    using Bits = V8i;
-};
-
-// Statistics of H four-lane halves (lanes 0 .. 4H-1 of frames eight floats apart): energy,
-// time weighting y = (1 - a) y + a p and its extremes, largest magnitude.
-template <std::size_t H>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* frames, std::size_t run,
-                                                               const LevelRun& r) {
-    using M = typename MagnitudeVec<H>::V;  // the lanes' floats
-    using Bits = typename MagnitudeVec<H>::Bits;
-    V4d e[H], y[H], mx[H], mn[H];
-    M mag;
-    for (std::size_t h = 0; h < H; ++h) {
-        __builtin_memcpy(&e[h], r.energy + 4 * h, sizeof(V4d));
-        __builtin_memcpy(&y[h], r.tw + 4 * h, sizeof(V4d));
-        __builtin_memcpy(&mx[h], r.maxima + 4 * h, sizeof(V4d));
-        __builtin_memcpy(&mn[h], r.minima + 4 * h, sizeof(V4d));
-    }
-    __builtin_memcpy(&mag, r.magnitude, sizeof mag);
-    const V4d a = r.alpha - V4d{};
-    const V4d keep = (1.0 - r.alpha) - V4d{};
-    const Bits noSign = (Bits{} + 0x7fffffff);
-    for (std::size_t k = 0; k < run; ++k) {
-        M v;
-        __builtin_memcpy(&v, frames + k * 8, sizeof v);
-        Bits bits;
-        __builtin_memcpy(&bits, &v, sizeof bits);
-        bits &= noSign;
-        M av;
-        __builtin_memcpy(&av, &bits, sizeof av);
-        ORV_MAX_F(mag, av);
-#pragma GCC unroll 2
-        for (std::size_t h = 0; h < H; ++h) {
-            V4f part;
-            __builtin_memcpy(&part, frames + k * 8 + 4 * h, sizeof part);
-            const V4d d = __builtin_convertvector(part, V4d);
-            const V4d p = d * d;
-            e[h] += p;
-            y[h] = keep * y[h] + a * p;
-            ORV_MAX_D(mx[h], y[h]);
-            ORV_MIN_D(mn[h], y[h]);
-        }
-    }
-    for (std::size_t h = 0; h < H; ++h) {
-        __builtin_memcpy(r.energy + 4 * h, &e[h], sizeof(V4d));
-        __builtin_memcpy(r.tw + 4 * h, &y[h], sizeof(V4d));
-        __builtin_memcpy(r.maxima + 4 * h, &mx[h], sizeof(V4d));
-        __builtin_memcpy(r.minima + 4 * h, &mn[h], sizeof(V4d));
-    }
-    __builtin_memcpy(r.magnitude, &mag, sizeof mag);
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline bool anyBit(const V8i& v) {
+    V4l wide;
+    __builtin_memcpy(&wide, &v, sizeof wide);
+    return ((wide[0] | wide[1]) | (wide[2] | wide[3])) != 0;
 }
 
-ORV_KERNEL_TARGET void levels8(const float* frames, std::size_t run, const LevelRun& r) {
-    levelsRun<2>(frames, run, r);
-}
-ORV_KERNEL_TARGET void levels4(const float* frames, std::size_t run, const LevelRun& r) {
-    levelsRun<1>(frames, run, r);
+// Frames of eight floats: the largest magnitudes of four frames against the thresholds,
+// then the frames one by one where one of the four reaches them.
+ORV_KERNEL_TARGET std::size_t crossing(const float* frames, std::size_t n, const float* threshold) {
+    V8f t;
+    __builtin_memcpy(&t, threshold, sizeof t);
+    std::size_t j = 0;
+    for (; j + 4 <= n; j += 4) {
+        V8f m = {};
+#pragma GCC unroll 4
+        for (std::size_t q = 0; q < 4; ++q) largest(frames + (j + q) * 8, m);
+        const V8i hit = m >= t;
+        if (anyBit(hit)) break;
+    }
+    for (; j < n; ++j) {
+        V8f m = {};
+        largest(frames + j * 8, m);
+        const V8i hit = m >= t;
+        if (anyBit(hit)) return j;
+    }
+    return n;
 }
 
 const KernelTable kTable = {
@@ -354,6 +450,6 @@ const KernelTable kTable = {
     {lanesD1, lanesD2, lanesD3, lanesD4},
     {zerosF1, zerosF2, zerosF3, zerosF4},
     {zerosD1, zerosD2, zerosD3, zerosD4},
-    levels8,
-    levels4,
+    levels,
+    crossing,
 };

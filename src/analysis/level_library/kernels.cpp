@@ -47,8 +47,12 @@ constexpr bool kIirBlocks = false;
 #define ORV_KERNEL_TARGET
 #define ORV_SELECT ORV_SELECT_BITS
 #define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
+#define ORV_WIDEN(out, v) ((out) = __builtin_convertvector((v), V4d))
+#define ORV_NARROW(out, v) ((out) = __builtin_convertvector((v), V4f))
 #include "kernel_bodies.h"
 #undef ORV_KERNEL_TARGET
+#undef ORV_WIDEN
+#undef ORV_NARROW
 #undef ORV_SELECT
 #undef ORV_BROADCAST
 #undef ORV_MAX_D
@@ -75,8 +79,12 @@ constexpr bool kIirBlocks = true;
 #define ORV_BROADCAST(v, k)                                                        \
     __builtin_shuffle(v, V4l{static_cast<long long>(k), static_cast<long long>(k), \
                              static_cast<long long>(k), static_cast<long long>(k)})
+#define ORV_WIDEN(out, v) ((out) = __builtin_ia32_cvtps2pd256(v))
+#define ORV_NARROW(out, v) ((out) = __builtin_ia32_cvtpd2ps256(v))
 #include "kernel_bodies.h"
 #undef ORV_KERNEL_TARGET
+#undef ORV_WIDEN
+#undef ORV_NARROW
 #undef ORV_SELECT
 #undef ORV_BROADCAST
 #undef ORV_MAX_D

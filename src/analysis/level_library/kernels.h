@@ -14,7 +14,8 @@
 // - zeros and lanes: up to eight band filters side by side, all-pole sections behind an
 //   input that already holds their zeros (see sos.h), float or double;
 // - levels: squares, energy, exponential time weighting and its extremes, and the largest
-//   magnitude of up to eight lanes (see band_levels.h).
+//   magnitude of four or eight lanes (see band_levels.h);
+// - crossing: the first frame where a lane reaches its threshold (peak search).
 #pragma once
 
 #include <cstddef>
@@ -34,7 +35,8 @@ struct IirBlockPlan {
     double sos[4][5];  // the sections (b0 b1 b2 a1 a2), for kernels that run them directly
 };
 
-// Running state of up to eight lanes of statistics (band_levels.h), in and out of a kernel.
+// Running state of the statistics of eight lanes (band_levels.h), in and out of a kernel:
+// lanes 0 .. lanes - 1 are computed (4 or 8), the others left alone.
 struct LevelRun {
     double* energy;
     double* tw;
@@ -42,6 +44,7 @@ struct LevelRun {
     double* minima;
     float* magnitude;
     double alpha;
+    unsigned lanes;
 };
 
 struct KernelTable {
@@ -62,9 +65,11 @@ struct KernelTable {
     // (1 - z^-2)^order of x (x[-8] .. x[-1] readable), n outputs; indexed by order - 1.
     void (*zerosF[4])(const float* x, std::size_t n, float* out);
     void (*zerosD[4])(const float* x, std::size_t n, double* out);
-    // run frames of eight floats; levels4 looks at lanes 0..3 only.
-    void (*levels8)(const float* frames, std::size_t run, const LevelRun& state);
-    void (*levels4)(const float* frames, std::size_t run, const LevelRun& state);
+    // Statistics of n frames of eight floats (see LevelRun).
+    void (*levels)(const float* frames, std::size_t n, const LevelRun& state);
+    // The first of n frames of eight floats where |frame[l]| >= threshold[l] for some lane
+    // l; n when there is none.
+    std::size_t (*crossing)(const float* frames, std::size_t n, const float* threshold);
 };
 
 // The generic table, the AVX2 table (null where this processor or build has none), and the

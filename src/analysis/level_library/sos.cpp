@@ -135,17 +135,27 @@ void BandZeros::process(const float* in, std::size_t n, T* out) {
         return;
     }
     const KernelTable& k = kernels();
-    for (std::size_t start = 0; start < n; start += kPiece) {
-        const std::size_t m = std::min(kPiece, n - start);
-        std::copy(in + start, in + start + m, padded_.begin() + 8);
+    auto* const kernel = [&] {
         if constexpr (std::is_same_v<T, float>) {
-            k.zerosF[order_ - 1](padded_.data() + 8, m, out + start);
+            return k.zerosF[order_ - 1];
         } else {
-            k.zerosD[order_ - 1](padded_.data() + 8, m, out + start);
+            return k.zerosD[order_ - 1];
         }
-        // The last eight samples lead the next piece.
-        std::copy(padded_.begin() + static_cast<std::ptrdiff_t>(m),
-                  padded_.begin() + static_cast<std::ptrdiff_t>(m + 8), padded_.begin());
+    }();
+    // The first eight outputs read the last samples of the previous call, the others only
+    // this call's.
+    const std::size_t head = std::min<std::size_t>(n, 8);
+    std::array<float, 16> start{};
+    std::copy(last_.begin(), last_.end(), start.begin());
+    std::copy(in, in + head, start.begin() + 8);
+    kernel(start.data() + 8, head, out);
+    if (n > 8) kernel(in + 8, n - 8, out + 8);
+    // Keep the last eight samples.
+    if (n >= 8) {
+        std::copy(in + n - 8, in + n, last_.begin());
+    } else {
+        std::copy(start.begin() + static_cast<std::ptrdiff_t>(n),
+                  start.begin() + static_cast<std::ptrdiff_t>(n + 8), last_.begin());
     }
 }
 

@@ -64,15 +64,14 @@ public:
     // Throws std::invalid_argument for an order above 4.
     explicit BandZeros(unsigned order = 0);
     unsigned order() const { return order_; }
-    void reset() { padded_.fill(0.0F); }
+    void reset() { last_.fill(0.0F); }
     // out[i] for in[i], i < n; T is float or double.
     template <typename T>
     void process(const float* in, std::size_t n, T* out);
 
 private:
-    static constexpr std::size_t kPiece = 256;
     unsigned order_;
-    std::array<float, 8 + kPiece> padded_{};  // the last eight samples, then a piece
+    std::array<float, 8> last_{};  // the last eight input samples
 };
 
 // Up to kLaneWidth band-pass filters fed with the same signal, run side by side: each lane
