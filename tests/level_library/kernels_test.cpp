@@ -96,7 +96,11 @@ TEST(Kernels, LaneStatisticsAndPeakSearchFollowTheirDefinition) {
                 std::fill(mx, mx + 8, -1.0);
                 std::fill(mn, mn + 8, 1e9);
                 const double alpha = 0.01;
-                const LevelRun run{e, y, mx, mn, mag, alpha, lanes};
+                double weights[9];
+                for (int j = 0; j <= 8; ++j) {
+                    weights[j] = (j < 8 ? alpha : 1.0) * std::pow(1.0 - alpha, j < 8 ? 7 - j : 8);
+                }
+                const LevelRun run{e, y, mx, mn, mag, alpha, weights, lanes};
                 std::vector<float> frames(300 * 8);
                 std::vector<float> stateF(16, 0.0F);
                 std::vector<double> stateD(16, 0.0);

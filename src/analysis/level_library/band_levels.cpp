@@ -53,6 +53,12 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
     tickSamples_ = static_cast<std::size_t>(std::lround(0.01 * inputRate / factor));
     periodSamples_ = static_cast<std::size_t>(std::lround(0.1 * inputRate / factor));
     if (code_ != TWeight::N) alpha_ = -std::expm1(-1.0 / (TWeight::timeConstant(code_) * rate));
+    double decay = 1.0;
+    for (std::size_t j = 8; j-- > 0;) {
+        weights_[j] = alpha_ * decay;
+        decay *= 1.0 - alpha_;
+    }
+    weights_[8] = decay;
     lowHalfOnly_ = true;
     for (std::size_t l = 0; l < W; ++l) {
         if (l >= 4 && lanes[l].active) lowHalfOnly_ = false;
@@ -115,9 +121,9 @@ void BandLevels<W>::resetStatistics() {
 
 template <std::size_t W>
 void BandLevels<W>::tick() {
-    for (std::size_t l = 0; l < W; ++l) {
-        if (active_[l] && primed_[l]) histogram_[l].addPower(tw_[l]);
-    }
+    std::array<bool, W> take{};
+    for (std::size_t l = 0; l < W; ++l) take[l] = active_[l] && primed_[l];
+    LevelHistogram::addPowers(histogram_.data(), tw_.data(), take.data(), W);
 }
 
 template <std::size_t W>
@@ -158,8 +164,8 @@ template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
     // Groups whose lanes 4..7 are unused need half the work.
-    const LevelRun run{energy_.data(),   tw_.data(), max_.data(),           min_.data(),
-                       magnitude.data(), alpha_,     lowHalfOnly_ ? 4U : 8U};
+    const LevelRun run{energy_.data(),    tw_.data(), max_.data(),     min_.data(),
+                       magnitude.data(),  alpha_,     weights_.data(), lowHalfOnly_ ? 4U : 8U};
     std::size_t i = 0;
     while (i < count) {
         const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);

@@ -35,10 +35,19 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& 
             td[i] = V4d{pl.t[i][1], pl.t[i][3], pl.t[i][5], pl.t[i][7]};
     }
     for (std::size_t b = 0; b < blocks; ++b) {
-        const float* x = in + b * 8;
+        // The block's inputs as doubles, each broadcast from memory (a load, not a shuffle).
+        alignas(32) double x[8];
+        V4f half;
+        V4d wide;
+#pragma GCC unroll 2
+        for (std::size_t h = 0; h < 2; ++h) {
+            __builtin_memcpy(&half, in + b * 8 + 4 * h, sizeof half);
+            ORV_WIDEN(wide, half);
+            __builtin_memcpy(x + 4 * h, &wide, sizeof wide);
+        }
         V4d u[8];
 #pragma GCC unroll 16
-        for (std::size_t i = 0; i < 8; ++i) u[i] = static_cast<double>(x[i]) - V4d{};
+        for (std::size_t i = 0; i < 8; ++i) ORV_BROADCAST_LOAD(u[i], x + i);
         // Inputs first (independent of the state), then the state, in four partial sums so
         // that the recursion from one block's state to the next is short.
         V4d next[2][4] = {};
@@ -217,13 +226,8 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
     __builtin_memcpy(&mag, r.magnitude, sizeof mag);
     const V4d a = r.alpha - V4d{};
     const V4d keep = (1.0 - r.alpha) - V4d{};
-    double c[8];  // c[j] = a (1 - a)^(7 - j)
-    double decay = 1.0;
-    for (std::size_t j = 8; j-- > 0;) {
-        c[j] = r.alpha * decay;
-        decay *= 1.0 - r.alpha;
-    }
-    const V4d keep8 = decay - V4d{};
+    const double* c = r.weights;  // c[j] = a (1 - a)^(7 - j)
+    const V4d keep8 = r.weights[8] - V4d{};
     std::size_t i = 0;
     for (; i + 8 <= n; i += 8) {
         const float* f = frames + i * 8;
@@ -239,15 +243,15 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
                 acc[h][j % 2] += c[j] * p;
             }
         }
-        V4l outside = {};
+        V4l inside = ~V4l{};
 #pragma GCC unroll 2
         for (std::size_t h = 0; h < H; ++h) {
             const V4d total = sum[h][0] + sum[h][1];
             e[h] += total;
-            // NaN counts as outside: the direct way then carries it into the extremes.
-            outside |= ~(y[h] + a * total <= mx[h]) | ~(keep8 * y[h] >= mn[h]);
+            // NaN is not inside: the direct way then carries it into the extremes.
+            inside &= (y[h] + a * total <= mx[h]) & (keep8 * y[h] >= mn[h]);
         }
-        if (outside[0] != 0 || outside[1] != 0 || outside[2] != 0 || outside[3] != 0) {
+        if (!ORV_ALL_SET(inside)) {
 #pragma GCC unroll 2
             for (std::size_t h = 0; h < H; ++h) {
                 for (std::size_t j = 0; j < 8; ++j) {

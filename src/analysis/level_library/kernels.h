@@ -44,6 +44,7 @@ struct LevelRun {
     double* minima;
     float* magnitude;
     double alpha;
+    const double* weights;  // a (1 - a)^(7 - j) for j = 0 .. 7, then (1 - a)^8
     unsigned lanes;
 };
 
