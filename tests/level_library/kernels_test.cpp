@@ -32,11 +32,12 @@ TEST(Kernels, GenericAndAvx2PathsAgree) {
         0.0, 1.0, 1.0);
     for (std::size_t k = 1; k <= 4; ++k) {
         const IirBlockPlan plan = makeIirBlockPlan(SosList(sos.begin(), sos.begin() + k));
+        const std::size_t blocks = 8 * 64 / IirBlockPlan::kBlock;
         for (int decimate = 0; decimate < 2; ++decimate) {
             std::vector<float> a(8 * 64), b(8 * 64);
             double sa[8] = {}, sb[8] = {};
-            (decimate ? gen.iirDecimate : gen.iir)[k - 1](plan, sa, in, 64, a.data());
-            (decimate ? avx2->iirDecimate : avx2->iir)[k - 1](plan, sb, in, 64, b.data());
+            (decimate ? gen.iirDecimate : gen.iir)[k - 1](plan, sa, in, blocks, a.data());
+            (decimate ? avx2->iirDecimate : avx2->iir)[k - 1](plan, sb, in, blocks, b.data());
             expectClose(a, b, "cascade ");
             for (std::size_t i = 0; i < 2 * k; ++i) EXPECT_NEAR(sa[i], sb[i], 1e-9);
         }

@@ -164,8 +164,8 @@ template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
     // Groups whose lanes 4..7 are unused need half the work.
-    const LevelRun run{energy_.data(),    tw_.data(), max_.data(),     min_.data(),
-                       magnitude.data(),  alpha_,     weights_.data(), lowHalfOnly_ ? 4U : 8U};
+    const LevelRun run{energy_.data(),   tw_.data(), max_.data(),     min_.data(),
+                       magnitude.data(), alpha_,     weights_.data(), lowHalfOnly_ ? 4U : 8U};
     std::size_t i = 0;
     while (i < count) {
         const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);

@@ -18,88 +18,88 @@ template <std::size_t N, bool Decimate>
 ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& pl, double* state,
                                                             const float* in, std::size_t blocks,
                                                             float* out) {
-    constexpr std::size_t kHalves = N > 4 ? 2 : 1;  // four-double parts of the state
-    constexpr std::size_t kOut = Decimate ? 1 : 2;  // four-double parts of the outputs
+    constexpr std::size_t B = IirBlockPlan::kBlock;
+    constexpr std::size_t kHalves = N > 4 ? 2 : 1;           // four-double parts of the state
+    constexpr std::size_t kRows = Decimate ? B / 8 : B / 4;  // four-output rows of a block
+    constexpr std::size_t kOut = Decimate ? B / 2 : B;       // outputs of a block
+    // Row r of the outputs' columns: input i, state k.
+    auto tRow = [&](std::size_t i, std::size_t r) -> const double* {
+        if constexpr (Decimate) {
+            return &pl.td[i][r * 4];
+        } else {
+            return &pl.t[i][r * 4];
+        }
+    };
+    auto oRow = [&](std::size_t k, std::size_t r) -> const double* {
+        if constexpr (Decimate) {
+            return &pl.od[k][r * 4];
+        } else {
+            return &pl.o[k][r * 4];
+        }
+    };
     V4d s[2] = {};
     __builtin_memcpy(&s[0], state, sizeof(V4d));
     if (kHalves == 2) __builtin_memcpy(&s[1], state + 4, sizeof(V4d));
-    // Decimated outputs are rows 1, 3, 5, 7: gather those rows of o and t once.
-    V4d od[N];
-    V4d td[8];
-    if (Decimate) {
-#pragma GCC unroll 16
-        for (std::size_t k = 0; k < N; ++k)
-            od[k] = V4d{pl.o[k][1], pl.o[k][3], pl.o[k][5], pl.o[k][7]};
-#pragma GCC unroll 16
-        for (std::size_t i = 0; i < 8; ++i)
-            td[i] = V4d{pl.t[i][1], pl.t[i][3], pl.t[i][5], pl.t[i][7]};
-    }
     for (std::size_t b = 0; b < blocks; ++b) {
         // The block's inputs as doubles, each broadcast from memory (a load, not a shuffle).
-        alignas(32) double x[8];
-        V4f half;
-        V4d wide;
-#pragma GCC unroll 2
-        for (std::size_t h = 0; h < 2; ++h) {
-            __builtin_memcpy(&half, in + b * 8 + 4 * h, sizeof half);
-            ORV_WIDEN(wide, half);
+        alignas(32) double x[B];
+#pragma GCC unroll 4
+        for (std::size_t h = 0; h < B / 4; ++h) {
+            V4f part;
+            V4d wide;
+            __builtin_memcpy(&part, in + b * B + 4 * h, sizeof part);
+            ORV_WIDEN(wide, part);
             __builtin_memcpy(x + 4 * h, &wide, sizeof wide);
         }
-        V4d u[8];
-#pragma GCC unroll 16
-        for (std::size_t i = 0; i < 8; ++i) ORV_BROADCAST_LOAD(u[i], x + i);
-        // Inputs first (independent of the state), then the state, in four partial sums so
-        // that the recursion from one block's state to the next is short.
+        // Inputs first (independent of the state), then the state; each sum in two parts so
+        // that the chains of dependent multiply-adds are short, above all the recursion from
+        // one block's state to the next.
         V4d next[2][4] = {};
-        V4d y[2][2] = {};
+        V4d y[kRows][2] = {};
 #pragma GCC unroll 16
-        for (std::size_t i = 0; i < 8; ++i) {
-#pragma GCC unroll 16
+        for (std::size_t i = 0; i < B; ++i) {
+            V4d u;
+            ORV_BROADCAST_LOAD(u, x + i);
+#pragma GCC unroll 2
             for (std::size_t h = 0; h < kHalves; ++h) {
                 V4d col;
                 __builtin_memcpy(&col, &pl.q[i][h * 4], sizeof col);
-                next[h][i % 2] += col * u[i];
+                next[h][i % 2] += col * u;
             }
-            if (Decimate) {
-                y[0][i % 2] += td[i] * u[i];
-            } else {
-#pragma GCC unroll 16
-                for (std::size_t h = 0; h < kOut; ++h) {
-                    if (h == 0 && i >= 4) continue;  // rows 0..3 do not see inputs 4..7
-                    V4d col;
-                    __builtin_memcpy(&col, &pl.t[i][h * 4], sizeof col);
-                    y[h][i % 2] += col * u[i];
-                }
+#pragma GCC unroll 4
+            for (std::size_t r = 0; r < kRows; ++r) {
+                // An input does not reach the outputs before it.
+                const std::size_t last = Decimate ? 8 * r + 7 : 4 * r + 3;
+                if (i > last) continue;
+                V4d col;
+                __builtin_memcpy(&col, tRow(i, r), sizeof col);
+                y[r][i % 2] += col * u;
             }
         }
-#pragma GCC unroll 16
+#pragma GCC unroll 8
         for (std::size_t k = 0; k < N; ++k) {
             const V4d sk = ORV_BROADCAST(s[k / 4], k % 4);
-#pragma GCC unroll 16
+#pragma GCC unroll 2
             for (std::size_t h = 0; h < kHalves; ++h) {
                 V4d col;
                 __builtin_memcpy(&col, &pl.p[k][h * 4], sizeof col);
                 next[h][2 + k % 2] += col * sk;
             }
-            if (Decimate) {
-                y[0][k % 2] += od[k] * sk;
-            } else {
-#pragma GCC unroll 16
-                for (std::size_t h = 0; h < kOut; ++h) {
-                    V4d col;
-                    __builtin_memcpy(&col, &pl.o[k][h * 4], sizeof col);
-                    y[h][k % 2] += col * sk;
-                }
+#pragma GCC unroll 4
+            for (std::size_t r = 0; r < kRows; ++r) {
+                V4d col;
+                __builtin_memcpy(&col, oRow(k, r), sizeof col);
+                y[r][k % 2] += col * sk;
             }
         }
-#pragma GCC unroll 16
+#pragma GCC unroll 2
         for (std::size_t h = 0; h < kHalves; ++h)
-            s[h] = (next[h][0] + next[h][1]) + (next[h][2] + next[h][3]);
-#pragma GCC unroll 16
-        for (std::size_t h = 0; h < kOut; ++h) {
+            s[h] = (next[h][2] + next[h][3]) + (next[h][0] + next[h][1]);
+#pragma GCC unroll 4
+        for (std::size_t r = 0; r < kRows; ++r) {
             V4f f;
-            ORV_NARROW(f, y[h][0] + y[h][1]);
-            __builtin_memcpy(out + b * (Decimate ? 4 : 8) + h * 4, &f, sizeof f);
+            ORV_NARROW(f, y[r][0] + y[r][1]);
+            __builtin_memcpy(out + b * kOut + r * 4, &f, sizeof f);
         }
     }
     __builtin_memcpy(state, &s[0], sizeof(V4d));
@@ -120,7 +120,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirSerial(const IirBlockPla
         s2[k] = state[2 * k + 1];
     }
     std::size_t written = 0;
-    for (std::size_t i = 0; i < blocks * 8; ++i) {
+    for (std::size_t i = 0; i < blocks * IirBlockPlan::kBlock; ++i) {
         double x = in[i];
 #pragma GCC unroll 4
         for (std::size_t k = 0; k < K; ++k) {

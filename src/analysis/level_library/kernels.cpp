@@ -47,7 +47,7 @@ constexpr bool kIirBlocks = false;
 #define ORV_KERNEL_TARGET
 #define ORV_SELECT ORV_SELECT_BITS
 #define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
-#define ORV_BROADCAST_LOAD(out, p) ((out) = *(p) - V4d{})
+#define ORV_BROADCAST_LOAD(out, p) ((out) = *(p)-V4d{})
 #define ORV_ALL_SET(v) (((v)[0] & (v)[1] & (v)[2] & (v)[3]) == -1)
 #define ORV_WIDEN(out, v) ((out) = __builtin_convertvector((v), V4d))
 #define ORV_NARROW(out, v) ((out) = __builtin_convertvector((v), V4f))

@@ -7,7 +7,7 @@
 //
 // Kernels:
 // - iir / iirDecimate: one signal through a cascade of up to four second-order sections,
-//   eight samples at a time as a state-space step (state of the sections' transposed
+//   sixteen samples at a time as a state-space step (state of the sections' transposed
 //   direct form II, see sos.h), every output or every second one; the generic path runs
 //   the sections sample by sample instead (the step costs four times its vector work on
 //   two-double registers without fused multiply-add), with the same state;
@@ -22,16 +22,19 @@
 
 namespace SlmLibrary {
 
-// Eight-sample state-space step of a cascade of up to four sections (state size 2K <= 8),
+// Sixteen-sample state-space step of a cascade of up to four sections (state size 2K <= 8),
 // all arrays column by column, padded with zeros: next state = p s + q u, outputs
-// y = o s + t u, for the state s at the start of the block and its inputs u.
+// y = o s + t u, for the state s at the start of the block and its inputs u; od and td are
+// the rows of o and t of the odd outputs (1, 3, .., 15), for decimation.
 struct IirBlockPlan {
-    static constexpr std::size_t kBlock = 8;
+    static constexpr std::size_t kBlock = 16;
     static constexpr std::size_t kMaxOrder = 8;
-    alignas(32) double p[kMaxOrder][kMaxOrder];  // p[k]: column k (state k -> next state)
-    alignas(32) double q[kBlock][kMaxOrder];     // q[i]: column i (input i -> next state)
-    alignas(32) double o[kMaxOrder][kBlock];     // o[k]: column k (state k -> outputs)
-    alignas(32) double t[kBlock][kBlock];        // t[i]: column i (input i -> outputs)
+    alignas(32) double p[kMaxOrder][kMaxOrder];    // p[k]: column k (state k -> next state)
+    alignas(32) double q[kBlock][kMaxOrder];       // q[i]: column i (input i -> next state)
+    alignas(32) double o[kMaxOrder][kBlock];       // o[k]: column k (state k -> outputs)
+    alignas(32) double t[kBlock][kBlock];          // t[i]: column i (input i -> outputs)
+    alignas(32) double od[kMaxOrder][kBlock / 2];  // o[k][2j + 1]
+    alignas(32) double td[kBlock][kBlock / 2];     // t[i][2j + 1]
     double sos[4][5];  // the sections (b0 b1 b2 a1 a2), for kernels that run them directly
 };
 
@@ -50,8 +53,9 @@ struct LevelRun {
 
 struct KernelTable {
     const char* name;
-    // `blocks` blocks of eight samples: out receives 8 per block (iir) or the odd samples,
-    // 4 per block (iirDecimate). in and out may be the same array. Indexed by order / 2 - 1.
+    // `blocks` blocks of kBlock samples: out receives kBlock per block (iir) or the odd
+    // samples, kBlock / 2 per block (iirDecimate). in and out may be the same array.
+    // Indexed by order / 2 - 1.
     void (*iir[4])(const IirBlockPlan& plan, double* state, const float* in, std::size_t blocks,
                    float* out);
     void (*iirDecimate[4])(const IirBlockPlan& plan, double* state, const float* in,

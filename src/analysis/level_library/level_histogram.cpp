@@ -75,8 +75,8 @@ void LevelHistogram::add(float db) {
 
 void LevelHistogram::addPower(double power) { addPowers(this, &power, nullptr, 1); }
 
-void LevelHistogram::addPowers(LevelHistogram* histograms, const double* powers,
-                               const bool* take, std::size_t n) {
+void LevelHistogram::addPowers(LevelHistogram* histograms, const double* powers, const bool* take,
+                               std::size_t n) {
     // The levels first, independent of each other, then the counts.
     constexpr std::size_t kBatch = 8;
     const LogTable& table = logTable();

@@ -48,6 +48,10 @@ IirBlockPlan makeIirBlockPlan(const SosList& sos) {
             plan.t[i][j] = step(sos, state, j == i ? 1.0 : 0.0);
         for (std::size_t r = 0; r < order; ++r) plan.q[i][r] = state[r];
     }
+    for (std::size_t j = 0; j < kBlock / 2; ++j) {
+        for (std::size_t k = 0; k < order; ++k) plan.od[k][j] = plan.o[k][2 * j + 1];
+        for (std::size_t i = 0; i < kBlock; ++i) plan.td[i][j] = plan.t[i][2 * j + 1];
+    }
     return plan;
 }
 
