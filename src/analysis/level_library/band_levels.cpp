@@ -14,9 +14,13 @@ namespace SlmLibrary {
 namespace {
 
 // Lanczos (a = 4) interpolation at quarter-sample offsets t = 0.25, 0.5, 0.75 from the
-// sample at tap 3 of eight consecutive samples; each kernel sums to one.
+// sample at tap 3 of eight consecutive samples; each kernel sums to one. For the six values
+// around a sample j (after j - 1 and after j) from the nine samples j - 4 .. j + 4 at once:
+// column m holds the weight of sample m in value 3 b + t (b = 0: around j - 1), zero where
+// the sample is not one of its taps, so each value sums its taps in order as h would.
 struct QuarterKernels {
     float h[3][8];
+    alignas(16) float columns[9][8];
 };
 
 QuarterKernels makeQuarterKernels() {
@@ -34,6 +38,14 @@ QuarterKernels makeQuarterKernels() {
             sum += taps[i];
         }
         for (int i = 0; i < 8; ++i) k.h[t][i] = static_cast<float>(taps[i] / sum);
+    }
+    for (int m = 0; m < 9; ++m) {
+        for (int b = 0; b < 2; ++b) {
+            for (int t = 0; t < 3; ++t) {
+                const int i = m - b;
+                k.columns[m][3 * b + t] = i >= 0 && i < 8 ? k.h[t][i] : 0.0F;
+            }
+        }
     }
     return k;
 }
@@ -221,16 +233,18 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
         threshold[l] = interpolate_[l] ? 0.7F * best[l] : std::numeric_limits<float>::infinity();
     }
     auto interpolateAround = [&](std::size_t j, std::size_t l) {
-        float w[9];  // samples j - 4 .. j + 4
-        for (std::size_t i = 0; i < 9; ++i) w[i] = x(j - 4 + i, l);
-        for (std::size_t base = 0; base < 2; ++base) {  // around j - 1, then j
-            for (int t = 0; t < 3; ++t) {
-                float s = 0.0F;
-                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * w[base + i];
-                best[l] = std::max(best[l], std::fabs(s));
+        using V4f = float __attribute__((vector_size(16)));
+        V4f s[2] = {};
+        for (std::size_t m = 0; m < 9; ++m) {
+            const float w = x(j - 4 + m, l);
+            for (std::size_t h = 0; h < 2; ++h) {
+                V4f c;
+                std::memcpy(&c, &k.columns[m][4 * h], sizeof c);
+                s[h] += c * w;
             }
         }
-        best[l] = std::max(best[l], std::fabs(w[4]));
+        for (std::size_t i = 0; i < 6; ++i) best[l] = std::max(best[l], std::fabs(s[i / 4][i % 4]));
+        best[l] = std::max(best[l], std::fabs(x(j, l)));
         threshold[l] = 0.7F * best[l];
     };
     // Only lanes whose largest magnitude reaches the threshold need a look at the frames:
