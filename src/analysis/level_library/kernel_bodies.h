@@ -138,6 +138,42 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirSerial(const IirBlockPla
     }
 }
 
+// Decimation in single precision: the whole state (up to eight values) in one vector, the
+// eight odd outputs of a block in another.
+ORV_KERNEL_TARGET void decimateF(const IirBlockPlan& pl, float* state, const float* in,
+                                 std::size_t blocks, float* out) {
+    constexpr std::size_t B = IirBlockPlan::kBlock;
+    V8f s;
+    __builtin_memcpy(&s, state, sizeof s);
+    for (std::size_t b = 0; b < blocks; ++b) {
+        const float* x = in + b * B;
+        V8f next[4] = {}, y[4] = {};
+#pragma GCC unroll 16
+        for (std::size_t i = 0; i < B; ++i) {
+            const V8f u = x[i] - V8f{};
+            V8f col;
+            __builtin_memcpy(&col, pl.qf[i], sizeof col);
+            next[i % 2] += col * u;
+            __builtin_memcpy(&col, pl.tdf[i], sizeof col);
+            y[i % 2] += col * u;
+        }
+#pragma GCC unroll 8
+        for (std::size_t k = 0; k < 8; ++k) {
+            V8f sk;
+            ORV_BROADCAST_F(sk, s, k);
+            V8f col;
+            __builtin_memcpy(&col, pl.pf[k], sizeof col);
+            next[2 + k % 2] += col * sk;
+            __builtin_memcpy(&col, pl.odf[k], sizeof col);
+            y[2 + k % 2] += col * sk;
+        }
+        s = (next[2] + next[3]) + (next[0] + next[1]);
+        const V8f outputs = (y[2] + y[3]) + (y[0] + y[1]);
+        __builtin_memcpy(out + b * (B / 2), &outputs, sizeof outputs);
+    }
+    __builtin_memcpy(state, &s, sizeof s);
+}
+
 #define ORV_IIR_ENTRY(NAME, N, DECIMATE)                                                \
     ORV_KERNEL_TARGET void NAME(const IirBlockPlan& pl, double* state, const float* in, \
                                 std::size_t blocks, float* out) {                       \
@@ -450,6 +486,7 @@ const KernelTable kTable = {
     kTableName,
     {iir2, iir4, iir6, iir8},
     {decimate2, decimate4, decimate6, decimate8},
+    decimateF,
     {lanesF1, lanesF2, lanesF3, lanesF4},
     {lanesD1, lanesD2, lanesD3, lanesD4},
     {zerosF1, zerosF2, zerosF3, zerosF4},

@@ -48,12 +48,14 @@ constexpr bool kIirBlocks = false;
 #define ORV_SELECT ORV_SELECT_BITS
 #define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
 #define ORV_BROADCAST_LOAD(out, p) ((out) = *(p)-V4d{})
+#define ORV_BROADCAST_F(out, v, k) ((out) = (v)[k] - V8f{})
 #define ORV_ALL_SET(v) (((v)[0] & (v)[1] & (v)[2] & (v)[3]) == -1)
 #define ORV_WIDEN(out, v) ((out) = __builtin_convertvector((v), V4d))
 #define ORV_NARROW(out, v) ((out) = __builtin_convertvector((v), V4f))
 #include "kernel_bodies.h"
 #undef ORV_KERNEL_TARGET
 #undef ORV_BROADCAST_LOAD
+#undef ORV_BROADCAST_F
 #undef ORV_ALL_SET
 #undef ORV_WIDEN
 #undef ORV_NARROW
@@ -84,12 +86,14 @@ constexpr bool kIirBlocks = true;
     __builtin_shuffle(v, V4l{static_cast<long long>(k), static_cast<long long>(k), \
                              static_cast<long long>(k), static_cast<long long>(k)})
 #define ORV_BROADCAST_LOAD(out, p) ((out) = __builtin_ia32_vbroadcastsd256(p))
+#define ORV_BROADCAST_F(out, v, k) ((out) = __builtin_shuffle((v), V8i{} + static_cast<int>(k)))
 #define ORV_ALL_SET(v) (__builtin_ia32_movmskpd256(reinterpret_cast<V4d>(v)) == 0xf)
 #define ORV_WIDEN(out, v) ((out) = __builtin_ia32_cvtps2pd256(v))
 #define ORV_NARROW(out, v) ((out) = __builtin_ia32_cvtpd2ps256(v))
 #include "kernel_bodies.h"
 #undef ORV_KERNEL_TARGET
 #undef ORV_BROADCAST_LOAD
+#undef ORV_BROADCAST_F
 #undef ORV_ALL_SET
 #undef ORV_WIDEN
 #undef ORV_NARROW

@@ -10,7 +10,8 @@
 //   sixteen samples at a time as a state-space step (state of the sections' transposed
 //   direct form II, see sos.h), every output or every second one; the generic path runs
 //   the sections sample by sample instead (the step costs four times its vector work on
-//   two-double registers without fused multiply-add), with the same state;
+//   two-double registers without fused multiply-add), with the same state; decimation also
+//   in single precision (anti-alias filters), one eight-float vector for the whole state;
 // - zeros and lanes: up to eight band filters side by side, all-pole sections behind an
 //   input that already holds their zeros (see sos.h), float or double;
 // - levels: squares, energy, exponential time weighting and its extremes, and the largest
@@ -35,6 +36,11 @@ struct IirBlockPlan {
     alignas(32) double t[kBlock][kBlock];          // t[i]: column i (input i -> outputs)
     alignas(32) double od[kMaxOrder][kBlock / 2];  // o[k][2j + 1]
     alignas(32) double td[kBlock][kBlock / 2];     // t[i][2j + 1]
+    // The same for decimation in single precision (state too).
+    alignas(32) float pf[kMaxOrder][kMaxOrder];
+    alignas(32) float qf[kBlock][kMaxOrder];
+    alignas(32) float odf[kMaxOrder][kBlock / 2];
+    alignas(32) float tdf[kBlock][kBlock / 2];
     double sos[4][5];  // the sections (b0 b1 b2 a1 a2), for kernels that run them directly
 };
 
@@ -60,6 +66,9 @@ struct KernelTable {
                    float* out);
     void (*iirDecimate[4])(const IirBlockPlan& plan, double* state, const float* in,
                            std::size_t blocks, float* out);
+    // iirDecimate in single precision, any order (state: eight floats).
+    void (*iirDecimateF)(const IirBlockPlan& plan, float* state, const float* in,
+                         std::size_t blocks, float* out);
     // n frames of eight lanes: lane l reads uLow or, where pick[l] != 0, uHigh; then the
     // all-pole sections (coef: per section a1[8], a2[8]; state: per section w1[8], w2[8]) and
     // the gain (gain[8]). Indexed by the number of sections - 1.

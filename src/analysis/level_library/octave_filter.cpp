@@ -183,7 +183,11 @@ std::vector<double> OctaveFilter::maskBreakpoints(Bank bank) {
 }
 
 OctaveFilter::OctaveFilter(Bank bank) : bank_(bank), design_(&design(bank)) {
-    for (unsigned s = 0; s + 1 < kStages; ++s) antiAlias_.emplace_back(design_->antiAlias);
+    // The anti-alias filters decimate in single precision: their poles stay well inside the
+    // unit circle, and the rounding noise stays near that of the float samples between the
+    // stages. Copies share one set of block matrices.
+    const SosCascade antiAlias(design_->antiAlias, SosCascade::Precision::Single);
+    antiAlias_.assign(kStages - 1, antiAlias);
     zeros_.resize(kStages);
     for (const Group& g : design_->groups) {
         std::vector<SosList> lanes(kLaneWidth);

@@ -52,24 +52,33 @@ IirBlockPlan makeIirBlockPlan(const SosList& sos) {
         for (std::size_t k = 0; k < order; ++k) plan.od[k][j] = plan.o[k][2 * j + 1];
         for (std::size_t i = 0; i < kBlock; ++i) plan.td[i][j] = plan.t[i][2 * j + 1];
     }
+    auto single = [](const auto& from, auto& to) {
+        std::transform(&from[0][0], &from[0][0] + sizeof from / sizeof from[0][0], &to[0][0],
+                       [](double v) { return static_cast<float>(v); });
+    };
+    single(plan.p, plan.pf);
+    single(plan.q, plan.qf);
+    single(plan.od, plan.odf);
+    single(plan.td, plan.tdf);
     return plan;
 }
 
-SosCascade::SosCascade(const SosList& sos) : sections_(sos.size()) {
+SosCascade::SosCascade(const SosList& sos, Precision decimation)
+    : sections_(sos.size()), single_(decimation == Precision::Single) {
     if (sos.size() > 4) throw std::invalid_argument("a cascade has at most four sections");
     if (!sos.empty()) plan_ = std::make_shared<const IirBlockPlan>(makeIirBlockPlan(sos));
 }
 
 void SosCascade::reset() {
     state_.fill(0.0);
+    stateF_.fill(0.0F);
     pendingCount_ = 0;
     odd_ = false;
 }
 
-template <bool Decimate>
-std::size_t SosCascade::run(const float* in, std::size_t n, float* out) {
-    const KernelTable& k = kernels();
-    auto* const kernel = Decimate ? k.iirDecimate[sections_ - 1] : k.iir[sections_ - 1];
+template <bool Decimate, typename S>
+std::size_t SosCascade::run(Kernel<S> kernel, std::array<S, IirBlockPlan::kMaxOrder>& state,
+                            const float* in, std::size_t n, float* out) {
     constexpr std::size_t kStep = Decimate ? 2 : 1;  // inputs per output
     std::size_t written = 0;
     std::size_t pos = 0;
@@ -80,7 +89,7 @@ std::size_t SosCascade::run(const float* in, std::size_t n, float* out) {
         std::copy(in + pos, in + pos + take, pending_.begin() + static_cast<std::ptrdiff_t>(from));
         std::fill(pending_.begin() + static_cast<std::ptrdiff_t>(from + take), pending_.end(),
                   0.0F);
-        alignas(32) std::array<double, IirBlockPlan::kMaxOrder> s = state_;
+        alignas(32) std::array<S, IirBlockPlan::kMaxOrder> s = state;
         float y[kBlock];
         kernel(*plan_, s.data(), pending_.data(), 1, y);
         for (std::size_t j = from; j < from + take; ++j) {
@@ -93,14 +102,14 @@ std::size_t SosCascade::run(const float* in, std::size_t n, float* out) {
         pendingCount_ += take;
         pos += take;
         if (pendingCount_ == kBlock) {
-            state_ = s;
+            state = s;
             pendingCount_ = 0;
         }
     };
     if (pendingCount_ > 0) partial(std::min(n, kBlock - pendingCount_));
     const std::size_t blocks = (n - pos) / kBlock;
     if (blocks > 0) {
-        kernel(*plan_, state_.data(), in + pos, blocks, out + written);
+        kernel(*plan_, state.data(), in + pos, blocks, out + written);
         pos += blocks * kBlock;
         written += blocks * kBlock / kStep;
     }
@@ -113,7 +122,7 @@ void SosCascade::process(const float* in, float* out, std::size_t n) {
         if (out != in) std::copy(in, in + n, out);
         return;
     }
-    run<false>(in, n, out);
+    run<false>(kernels().iir[sections_ - 1], state_, in, n, out);
 }
 
 std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* out) {
@@ -125,7 +134,8 @@ std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* o
         }
         return written;
     }
-    return run<true>(in, n, out);
+    if (single_) return run<true>(kernels().iirDecimateF, stateF_, in, n, out);
+    return run<true>(kernels().iirDecimate[sections_ - 1], state_, in, n, out);
 }
 
 BandZeros::BandZeros(unsigned order) : order_(order) {

@@ -19,8 +19,9 @@ namespace SlmLibrary {
 IirBlockPlan makeIirBlockPlan(const SosList& sos);
 
 // One signal through a cascade of up to four sections, double precision (used where poles
-// sit close to z = 1 at the full rate: frequency weighting, filtered channel, anti-alias
-// filters). The cascade runs in blocks of eight samples counted from reset: each block is
+// sit close to z = 1 at the full rate: frequency weighting, filtered channel), or for
+// decimation in single precision (anti-alias filters). The cascade runs in blocks of
+// sixteen samples counted from reset: each block is
 // one state-space step (the state of the sections' transposed direct form II at the block
 // start, times fixed matrices, plus the block's inputs times fixed matrices, computed once
 // from the sections), which turns a chain of dependent multiply-adds per sample into
@@ -30,9 +31,14 @@ IirBlockPlan makeIirBlockPlan(const SosList& sos);
 // into calls.
 class SosCascade {
 public:
+    enum class Precision { Double, Single };
+
     SosCascade() = default;
-    // Throws std::invalid_argument for more than four sections.
-    explicit SosCascade(const SosList& sos);
+    // decimation: the precision of processDecimate. Single (state and block matrices in
+    // float) suits filters whose poles stay well inside the unit circle, such as the
+    // anti-alias filters of the octave bank: their rounding noise stays near that of the
+    // float samples themselves. Throws std::invalid_argument for more than four sections.
+    explicit SosCascade(const SosList& sos, Precision decimation = Precision::Double);
 
     void reset();
     // in and out may be the same array.
@@ -45,12 +51,18 @@ public:
     std::size_t sections() const { return sections_; }
 
 private:
-    template <bool Decimate>
-    std::size_t run(const float* in, std::size_t n, float* out);
+    template <typename S>
+    using Kernel = void (*)(const IirBlockPlan&, S*, const float*, std::size_t, float*);
+    template <bool Decimate, typename S>
+    std::size_t run(Kernel<S> kernel, std::array<S, IirBlockPlan::kMaxOrder>& state,
+                    const float* in, std::size_t n, float* out);
 
     std::size_t sections_ = 0;
+    bool single_ = false;
     std::shared_ptr<const IirBlockPlan> plan_;  // read-only, shared by copies
-    alignas(32) std::array<double, IirBlockPlan::kMaxOrder> state_{};  // at the block start
+    // At the block start, double or single precision.
+    alignas(32) std::array<double, IirBlockPlan::kMaxOrder> state_{};
+    alignas(32) std::array<float, IirBlockPlan::kMaxOrder> stateF_{};
     std::array<float, IirBlockPlan::kBlock> pending_{};  // inputs of the unfinished block
     std::size_t pendingCount_ = 0;
     bool odd_ = false;  // decimation phase (no sections)
