@@ -71,6 +71,7 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
         decay *= 1.0 - alpha_;
     }
     weights_[8] = decay;
+    for (std::size_t j = 0; j < 8; ++j) weightsF_[j] = static_cast<float>(weights_[j]);
     lowHalfOnly_ = true;
     for (std::size_t l = 0; l < W; ++l) {
         if (l >= 4 && lanes[l].active) lowHalfOnly_ = false;
@@ -176,8 +177,9 @@ template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
     // Groups whose lanes 4..7 are unused need half the work.
-    const LevelRun run{energy_.data(),   tw_.data(), max_.data(),     min_.data(),
-                       magnitude.data(), alpha_,     weights_.data(), lowHalfOnly_ ? 4U : 8U};
+    const LevelRun run{energy_.data(),  tw_.data(),       max_.data(),
+                       min_.data(),     magnitude.data(), alpha_,
+                       weights_.data(), weightsF_.data(), lowHalfOnly_ ? 4U : 8U};
     std::size_t i = 0;
     while (i < count) {
         const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);

@@ -90,8 +90,9 @@ private:
     double rate_ = 1.0;
     double alpha_ = 0.0;
     std::array<double, 9> weights_{};  // of eight frames (LevelRun)
-    std::size_t tickSamples_ = 1;      // 10 ms
-    std::size_t periodSamples_ = 1;    // 100 ms (N)
+    std::array<float, 8> weightsF_{};
+    std::size_t tickSamples_ = 1;    // 10 ms
+    std::size_t periodSamples_ = 1;  // 100 ms (N)
     std::array<bool, W> active_{};
     std::array<bool, W> interpolate_{};
     bool anyInterpolated_ = false;

@@ -262,30 +262,37 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
     __builtin_memcpy(&mag, r.magnitude, sizeof mag);
     const V4d a = r.alpha - V4d{};
     const V4d keep = (1.0 - r.alpha) - V4d{};
-    const double* c = r.weights;  // c[j] = a (1 - a)^(7 - j)
     const V4d keep8 = r.weights[8] - V4d{};
+    // The sums of a block in single precision (they cover eight squares, each within
+    // 6e-8 of its exact value), slightly widened where they bound the levels.
+    const float* cf = r.weightsF;
+    constexpr double kSlack = 1.0 + 1.0 / 65536.0;
     std::size_t i = 0;
     for (; i + 8 <= n; i += 8) {
         const float* f = frames + i * 8;
-        V4d sum[H][2] = {}, acc[H][2] = {};
+        V8f sum[2] = {}, acc[2] = {};
 #pragma GCC unroll 8
         for (std::size_t j = 0; j < 8; ++j) {
             largest(f + j * 8, mag);
-#pragma GCC unroll 2
-            for (std::size_t h = 0; h < H; ++h) {
-                V4d p;
-                squares(f + j * 8, h, p);
-                sum[h][j % 2] += p;
-                acc[h][j % 2] += c[j] * p;
-            }
+            V8f x;
+            __builtin_memcpy(&x, f + j * 8, sizeof x);
+            const V8f p = x * x;
+            sum[j % 2] += p;
+            acc[j % 2] += cf[j] * p;
         }
+        const V8f sum8 = sum[0] + sum[1];
+        const V8f acc8 = acc[0] + acc[1];
+        V4d total[H], weighted[H];
         V4l inside = ~V4l{};
 #pragma GCC unroll 2
         for (std::size_t h = 0; h < H; ++h) {
-            const V4d total = sum[h][0] + sum[h][1];
-            e[h] += total;
+            V4f part;
+            __builtin_memcpy(&part, reinterpret_cast<const float*>(&sum8) + 4 * h, sizeof part);
+            ORV_WIDEN(total[h], part);
+            __builtin_memcpy(&part, reinterpret_cast<const float*>(&acc8) + 4 * h, sizeof part);
+            ORV_WIDEN(weighted[h], part);
             // NaN is not inside: the direct way then carries it into the extremes.
-            inside &= (y[h] + a * total <= mx[h]) & (keep8 * y[h] >= mn[h]);
+            inside &= (y[h] + (a * kSlack) * total[h] <= mx[h]) & (keep8 * y[h] >= mn[h]);
         }
         if (!ORV_ALL_SET(inside)) {
 #pragma GCC unroll 2
@@ -293,11 +300,15 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
                 for (std::size_t j = 0; j < 8; ++j) {
                     V4d p;
                     weigh(f + j * 8, h, a, keep, y[h], mx[h], mn[h], p);
+                    e[h] += p;
                 }
             }
         } else {
 #pragma GCC unroll 2
-            for (std::size_t h = 0; h < H; ++h) y[h] = keep8 * y[h] + (acc[h][0] + acc[h][1]);
+            for (std::size_t h = 0; h < H; ++h) {
+                e[h] += total[h];
+                y[h] = keep8 * y[h] + weighted[h];
+            }
         }
     }
     for (; i < n; ++i) {

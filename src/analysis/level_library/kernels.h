@@ -54,6 +54,7 @@ struct LevelRun {
     float* magnitude;
     double alpha;
     const double* weights;  // a (1 - a)^(7 - j) for j = 0 .. 7, then (1 - a)^8
+    const float* weightsF;  // the first eight as floats
     unsigned lanes;
 };
 
