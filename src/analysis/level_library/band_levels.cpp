@@ -85,6 +85,7 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
                 : static_cast<std::uint64_t>(std::ceil(lanes[l].primeSeconds * rate));
         primeEnd_[l] = settleEnd_[l] + prime;
     }
+    candidates_.resize(256);  // calls of several hundred frames without allocation
     histogram_.reserve(W);
     for (std::size_t l = 0; l < W; ++l) {
         histogram_.emplace_back(active_[l] ? LevelHistogram() : LevelHistogram(0.0F, 0.0F));
@@ -176,16 +177,33 @@ void BandLevels<W>::finishPriming(std::size_t l) {
 template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
+    // The peak search looks at no sample below 0.7 of the lane's peak so far: the kernel lists
+    // the stretches of frames that reach it.
+    std::array<float, W> reach{};
+    for (std::size_t l = 0; l < W; ++l) {
+        reach[l] = interpolate_[l] ? 0.7F * std::max(truePeak_[l], peak_[l])
+                                   : std::numeric_limits<float>::infinity();
+    }
+    const std::size_t room = 2 * (count / 8 + count / tickSamples_ + 2);
+    if (candidates_.size() < room) candidates_.resize(room);
+    candidateCount_ = 0;
     // Groups whose lanes 4..7 are unused need half the work.
-    const LevelRun run{energy_.data(),  tw_.data(),       max_.data(),
-                       min_.data(),     magnitude.data(), alpha_,
-                       weights_.data(), weightsF_.data(), lowHalfOnly_ ? 4U : 8U};
+    LevelRun run{energy_.data(),     tw_.data(),       max_.data(),
+                 min_.data(),        magnitude.data(), alpha_,
+                 weights_.data(),    weightsF_.data(), reach.data(),
+                 candidates_.data(), &candidateCount_, lowHalfOnly_ ? 4U : 8U};
     std::size_t i = 0;
     while (i < count) {
         const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);
         const float* f = frames + i * W;
         if constexpr (W == 8) {
+            const std::size_t before = candidateCount_;
+            run.candidates = candidates_.data() + 2 * before;
+            std::size_t added = 0;
+            run.candidateCount = &added;
             kernels().levels(f, n, run);
+            for (std::size_t c = 0; c < added; ++c) candidates_[2 * (before + c)] += i;
+            candidateCount_ = before + added;
         } else {
             const double a = alpha_;
             for (std::size_t k = 0; k < n; ++k) {
@@ -268,12 +286,16 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
     };
     std::size_t j = begin;
     for (; j < std::min(end, kHistory); ++j) visit(j);
-    while (j < end) {
-        if constexpr (W == 8) {
-            j += kernels().crossing(frames + (j - kHistory) * W, end - j, threshold.data());
-            if (j == end) break;
+    if constexpr (W == 8) {
+        // The call's frames: only the stretches the statistics kernel found reaching the
+        // threshold the call started with (the threshold only rises).
+        for (std::size_t c = 0; c < candidateCount_ && j < end; ++c) {
+            const std::size_t first = kHistory + candidates_[2 * c];
+            const std::size_t last = std::min(end, first + candidates_[2 * c + 1]);
+            for (j = std::max(j, first); j < last; ++j) visit(j);
         }
-        visit(j++);
+    } else {
+        for (; j < end; ++j) visit(j);
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (interpolate_[l]) truePeak_[l] = best[l];

@@ -120,6 +120,9 @@ private:
     std::array<double, W> min_{};
     std::array<bool, W> hasExtremes_{};
     std::array<float, W> truePeak_{};
+    // Stretches of a call's frames for the peak search: first, count (LevelRun).
+    std::vector<std::uint32_t> candidates_;
+    std::size_t candidateCount_ = 0;
     std::vector<LevelHistogram> histogram_;
     // Last frames of the previous call (for interpolation across calls).
     static constexpr std::size_t kHistory = 8;

@@ -247,6 +247,25 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void weigh(const float* f, std::
     ORV_MIN_D(mn, y);
 }
 
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline bool anyBit(const V8i& v) {
+    V4l wide;
+    __builtin_memcpy(&wide, &v, sizeof wide);
+    return ((wide[0] | wide[1]) | (wide[2] | wide[3])) != 0;
+}
+
+// Records frames first .. first + count - 1 for the peak search when their largest
+// magnitudes bm reach a lane's threshold.
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void candidate(const LevelRun& r, const V8f& bm,
+                                                               const V8f& reach, std::size_t first,
+                                                               std::size_t count) {
+    const V8i hit = bm >= reach;
+    if (anyBit(hit)) {
+        r.candidates[2 * *r.candidateCount] = static_cast<std::uint32_t>(first);
+        r.candidates[2 * *r.candidateCount + 1] = static_cast<std::uint32_t>(count);
+        ++*r.candidateCount;
+    }
+}
+
 template <std::size_t H>
 ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* frames, std::size_t n,
                                                                const LevelRun& r) {
@@ -260,6 +279,8 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
         __builtin_memcpy(&mn[h], r.minima + 4 * h, sizeof(V4d));
     }
     __builtin_memcpy(&mag, r.magnitude, sizeof mag);
+    V8f reach;
+    __builtin_memcpy(&reach, r.reach, sizeof reach);
     const V4d a = r.alpha - V4d{};
     const V4d keep = (1.0 - r.alpha) - V4d{};
     const V4d keep8 = r.weights[8] - V4d{};
@@ -270,16 +291,18 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
     std::size_t i = 0;
     for (; i + 8 <= n; i += 8) {
         const float* f = frames + i * 8;
-        V8f sum[2] = {}, acc[2] = {};
+        V8f sum[2] = {}, acc[2] = {}, bm = {};
 #pragma GCC unroll 8
         for (std::size_t j = 0; j < 8; ++j) {
-            largest(f + j * 8, mag);
+            largest(f + j * 8, bm);
             V8f x;
             __builtin_memcpy(&x, f + j * 8, sizeof x);
             const V8f p = x * x;
             sum[j % 2] += p;
             acc[j % 2] += cf[j] * p;
         }
+        ORV_MAX_F(mag, bm);
+        candidate(r, bm, reach, i, 8);
         const V8f sum8 = sum[0] + sum[1];
         const V8f acc8 = acc[0] + acc[1];
         V4d total[H], weighted[H];
@@ -311,14 +334,19 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
             }
         }
     }
-    for (; i < n; ++i) {
-        largest(frames + i * 8, mag);
+    if (i < n) {
+        V8f bm = {};
+        for (std::size_t k = i; k < n; ++k) {
+            largest(frames + k * 8, bm);
 #pragma GCC unroll 2
-        for (std::size_t h = 0; h < H; ++h) {
-            V4d p;
-            weigh(frames + i * 8, h, a, keep, y[h], mx[h], mn[h], p);
-            e[h] += p;
+            for (std::size_t h = 0; h < H; ++h) {
+                V4d p;
+                weigh(frames + k * 8, h, a, keep, y[h], mx[h], mn[h], p);
+                e[h] += p;
+            }
         }
+        ORV_MAX_F(mag, bm);
+        candidate(r, bm, reach, i, n - i);
     }
 #pragma GCC unroll 2
     for (std::size_t h = 0; h < H; ++h) {
@@ -327,7 +355,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
         __builtin_memcpy(r.maxima + 4 * h, &mx[h], sizeof(V4d));
         __builtin_memcpy(r.minima + 4 * h, &mn[h], sizeof(V4d));
     }
-    __builtin_memcpy(r.magnitude, &mag, 4 * H * sizeof(float));
+    __builtin_memcpy(r.magnitude, &mag, sizeof mag);
 }
 
 ORV_KERNEL_TARGET void levels(const float* frames, std::size_t n, const LevelRun& r) {
@@ -465,34 +493,6 @@ ORV_ZEROS_ENTRY(zerosD3, double, 3)
 ORV_ZEROS_ENTRY(zerosD4, double, 4)
 #undef ORV_ZEROS_ENTRY
 
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline bool anyBit(const V8i& v) {
-    V4l wide;
-    __builtin_memcpy(&wide, &v, sizeof wide);
-    return ((wide[0] | wide[1]) | (wide[2] | wide[3])) != 0;
-}
-
-// Frames of eight floats: the largest magnitudes of four frames against the thresholds,
-// then the frames one by one where one of the four reaches them.
-ORV_KERNEL_TARGET std::size_t crossing(const float* frames, std::size_t n, const float* threshold) {
-    V8f t;
-    __builtin_memcpy(&t, threshold, sizeof t);
-    std::size_t j = 0;
-    for (; j + 4 <= n; j += 4) {
-        V8f m = {};
-#pragma GCC unroll 4
-        for (std::size_t q = 0; q < 4; ++q) largest(frames + (j + q) * 8, m);
-        const V8i hit = m >= t;
-        if (anyBit(hit)) break;
-    }
-    for (; j < n; ++j) {
-        V8f m = {};
-        largest(frames + j * 8, m);
-        const V8i hit = m >= t;
-        if (anyBit(hit)) return j;
-    }
-    return n;
-}
-
 const KernelTable kTable = {
     kTableName,
     {iir2, iir4, iir6, iir8},
@@ -503,5 +503,4 @@ const KernelTable kTable = {
     {zerosF1, zerosF2, zerosF3, zerosF4},
     {zerosD1, zerosD2, zerosD3, zerosD4},
     levels,
-    crossing,
 };

@@ -14,12 +14,12 @@
 //   in single precision (anti-alias filters), one eight-float vector for the whole state;
 // - zeros and lanes: up to eight band filters side by side, all-pole sections behind an
 //   input that already holds their zeros (see sos.h), float or double;
-// - levels: squares, energy, exponential time weighting and its extremes, and the largest
-//   magnitude of four or eight lanes (see band_levels.h);
-// - crossing: the first frame where a lane reaches its threshold (peak search).
+// - levels: squares, energy, exponential time weighting and its extremes of four or eight
+//   lanes, and where the magnitudes reach thresholds for the peak search (band_levels.h).
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 
 namespace SlmLibrary {
 
@@ -45,16 +45,21 @@ struct IirBlockPlan {
 };
 
 // Running state of the statistics of eight lanes (band_levels.h), in and out of a kernel:
-// lanes 0 .. lanes - 1 are computed (4 or 8), the others left alone.
+// lanes 0 .. lanes - 1 are computed (4 or 8), the others left alone. For the peak search,
+// the kernel also lists the stretches of up to eight frames (first, count: frame numbers
+// from the start of its frames) where a lane's magnitude reaches `reach`.
 struct LevelRun {
     double* energy;
     double* tw;
     double* maxima;
     double* minima;
-    float* magnitude;
+    float* magnitude;  // largest magnitude, max with what is there (all eight lanes)
     double alpha;
-    const double* weights;  // a (1 - a)^(7 - j) for j = 0 .. 7, then (1 - a)^8
-    const float* weightsF;  // the first eight as floats
+    const double* weights;      // a (1 - a)^(7 - j) for j = 0 .. 7, then (1 - a)^8
+    const float* weightsF;      // the first eight as floats
+    const float* reach;         // eight thresholds (+inf: no search)
+    std::uint32_t* candidates;  // pairs first, count; room for one per eight frames and one
+    std::size_t* candidateCount;
     unsigned lanes;
 };
 
@@ -82,9 +87,6 @@ struct KernelTable {
     void (*zerosD[4])(const float* x, std::size_t n, double* out);
     // Statistics of n frames of eight floats (see LevelRun).
     void (*levels)(const float* frames, std::size_t n, const LevelRun& state);
-    // The first of n frames of eight floats where |frame[l]| >= threshold[l] for some lane
-    // l; n when there is none.
-    std::size_t (*crossing)(const float* frames, std::size_t n, const float* threshold);
 };
 
 // The generic table, the AVX2 table (null where this processor or build has none), and the
