@@ -69,6 +69,17 @@ TEST(Kernels, GenericAndAvx2PathsAgree) {
         avx2->lanesF[k - 1](in, in - 8, 512, b.data(), coefF.data(), gainF.data(), pickF.data(),
                             sb.data());
         expectClose(a, b, "float lanes ");
+        // Unused lanes (gain zero, as SosLanes leaves them) read zero; the generic path skips
+        // a part of them.
+        std::fill(gainF.begin() + 4, gainF.end(), 0.0F);
+        gen.lanesF[k - 1](in, in - 8, 512, a.data(), coefF.data(), gainF.data(), pickF.data(),
+                          sa.data());
+        avx2->lanesF[k - 1](in, in - 8, 512, b.data(), coefF.data(), gainF.data(), pickF.data(),
+                            sb.data());
+        expectClose(a, b, "float lanes, four unused ");
+        for (std::size_t i = 4; i < 512 * 8; i += (i % 8 == 7 ? 5 : 1)) {
+            ASSERT_EQ(a[i], 0.0F) << i;
+        }
         std::vector<double> da(2 * k * 8), db(2 * k * 8);
         gen.lanesD[k - 1](xd.data(), xd2.data(), 512, a.data(), coefD.data(), gainD.data(),
                           pickD.data(), da.data());

@@ -1,6 +1,8 @@
 // Bodies of the kernels of kernels.h. kernels.cpp includes this file once per instruction
 // set, each time inside its own namespace and with ORV_KERNEL_TARGET set to that set's
-// function attributes; it includes no header of its own. Types V4d, V8f, V4f, V4l, V4i, V8i
+// function attributes; it includes no header of its own. With ORV_NARROW_KERNELS defined
+// (the generic path) the kernels that kernel_narrow.h writes for 16-byte vectors are left
+// out. Types V4d, V8f, V4f, V4l, V4i, V8i
 // (GCC vectors) come from kernels.cpp.
 //
 // Written with GCC vector types: each operation on eight floats or four doubles is one AVX
@@ -138,6 +140,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirSerial(const IirBlockPla
     }
 }
 
+#if !defined(ORV_NARROW_KERNELS)
 // Decimation in single precision: the whole state (up to eight values) in one vector, the
 // eight odd outputs of a block in another.
 ORV_KERNEL_TARGET void decimateF(const IirBlockPlan& pl, float* state, const float* in,
@@ -173,6 +176,8 @@ ORV_KERNEL_TARGET void decimateF(const IirBlockPlan& pl, float* state, const flo
     }
     __builtin_memcpy(state, &s, sizeof s);
 }
+
+#endif
 
 #define ORV_IIR_ENTRY(NAME, N, DECIMATE)                                                \
     ORV_KERNEL_TARGET void NAME(const IirBlockPlan& pl, double* state, const float* in, \
@@ -358,6 +363,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* fram
     __builtin_memcpy(r.magnitude, &mag, sizeof mag);
 }
 
+#if !defined(ORV_NARROW_KERNELS)
 ORV_KERNEL_TARGET void levels(const float* frames, std::size_t n, const LevelRun& r) {
     if (r.lanes <= 4) {
         levelsRun<1>(frames, n, r);
@@ -365,6 +371,7 @@ ORV_KERNEL_TARGET void levels(const float* frames, std::size_t n, const LevelRun
         levelsRun<2>(frames, n, r);
     }
 }
+#endif
 
 template <typename T, std::size_t K>
 ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, const T* uHigh,
@@ -428,6 +435,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
     }
 }
 
+#if !defined(ORV_NARROW_KERNELS)
 #define ORV_LANES_ENTRY(NAME, T, K)                                                              \
     ORV_KERNEL_TARGET void NAME(const T* lo, const T* hi, std::size_t n, float* out, const T* c, \
                                 const T* g, const T* pick, T* s) {                               \
@@ -442,6 +450,7 @@ ORV_LANES_ENTRY(lanesD2, double, 2)
 ORV_LANES_ENTRY(lanesD3, double, 3)
 ORV_LANES_ENTRY(lanesD4, double, 4)
 #undef ORV_LANES_ENTRY
+#endif
 
 // (1 - z^-2)^Order of x (x[-8] .. x[-1] readable), in double, stored as T; eight outputs a
 // step.
@@ -492,15 +501,3 @@ ORV_ZEROS_ENTRY(zerosD2, double, 2)
 ORV_ZEROS_ENTRY(zerosD3, double, 3)
 ORV_ZEROS_ENTRY(zerosD4, double, 4)
 #undef ORV_ZEROS_ENTRY
-
-const KernelTable kTable = {
-    kTableName,
-    {iir2, iir4, iir6, iir8},
-    {decimate2, decimate4, decimate6, decimate8},
-    decimateF,
-    {lanesF1, lanesF2, lanesF3, lanesF4},
-    {lanesD1, lanesD2, lanesD3, lanesD4},
-    {zerosF1, zerosF2, zerosF3, zerosF4},
-    {zerosD1, zerosD2, zerosD3, zerosD4},
-    levels,
-};

@@ -11,6 +11,7 @@ typedef float V4f __attribute__((vector_size(16)));
 typedef long long V4l __attribute__((vector_size(32)));
 typedef int V4i __attribute__((vector_size(16)));
 typedef int V8i __attribute__((vector_size(32)));
+typedef long long V2l __attribute__((vector_size(16)));
 
 // Lane-wise select and element broadcast. AVX: the vector forms, one instruction each.
 // Generic (vectors of two SSE registers): bit operations, which stay vector code.
@@ -52,7 +53,21 @@ constexpr bool kIirBlocks = false;
 #define ORV_ALL_SET(v) (((v)[0] & (v)[1] & (v)[2] & (v)[3]) == -1)
 #define ORV_WIDEN(out, v) ((out) = __builtin_convertvector((v), V4d))
 #define ORV_NARROW(out, v) ((out) = __builtin_convertvector((v), V4f))
+#define ORV_NARROW_KERNELS
 #include "kernel_bodies.h"
+#include "kernel_narrow.h"
+#undef ORV_NARROW_KERNELS
+const KernelTable kTable = {
+    kTableName,
+    {iir2, iir4, iir6, iir8},
+    {decimate2, decimate4, decimate6, decimate8},
+    decimateNarrow,
+    {lanesNarrowF1, lanesNarrowF2, lanesNarrowF3, lanesNarrowF4},
+    {lanesNarrowD1, lanesNarrowD2, lanesNarrowD3, lanesNarrowD4},
+    {zerosF1, zerosF2, zerosF3, zerosF4},
+    {zerosD1, zerosD2, zerosD3, zerosD4},
+    levelsNarrowEntry,
+};
 #undef ORV_KERNEL_TARGET
 #undef ORV_BROADCAST_LOAD
 #undef ORV_BROADCAST_F
@@ -91,6 +106,17 @@ constexpr bool kIirBlocks = true;
 #define ORV_WIDEN(out, v) ((out) = __builtin_ia32_cvtps2pd256(v))
 #define ORV_NARROW(out, v) ((out) = __builtin_ia32_cvtpd2ps256(v))
 #include "kernel_bodies.h"
+const KernelTable kTable = {
+    kTableName,
+    {iir2, iir4, iir6, iir8},
+    {decimate2, decimate4, decimate6, decimate8},
+    decimateF,
+    {lanesF1, lanesF2, lanesF3, lanesF4},
+    {lanesD1, lanesD2, lanesD3, lanesD4},
+    {zerosF1, zerosF2, zerosF3, zerosF4},
+    {zerosD1, zerosD2, zerosD3, zerosD4},
+    levels,
+};
 #undef ORV_KERNEL_TARGET
 #undef ORV_BROADCAST_LOAD
 #undef ORV_BROADCAST_F
