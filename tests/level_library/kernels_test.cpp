@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <stdexcept>
 #include <vector>
 
 #include "kernels.h"
@@ -50,10 +51,11 @@ TEST(Kernels, GenericAndAvx2PathsAgree) {
                 expectClose(c, b, "single-precision decimation ");
             }
         }
-        // Eight lanes of k all-pole sections, half of them on a second input.
-        std::vector<float> coefF(2 * k * 8), gainF(8, 0.5F), pickF(8), stateF(2 * k * 8);
+        // Eight lanes of k all-pole sections, half of them adding a pair of zeros to the input
+        // of the last section.
+        std::vector<float> coefF(2 * k * 8), gainF(8, 0.5F), zeroF(8), stateF(2 * k * 8);
         for (std::size_t l = 0; l < 8; ++l) {
-            pickF[l] = l % 2 == 0 ? 1.0F : 0.0F;
+            zeroF[l] = l % 2 == 0 && k > 1 ? 1.0F : 0.0F;
             for (std::size_t s = 0; s < k; ++s) {
                 const double r = 0.9, theta = 0.1 + 0.3 * static_cast<double>(l + s) / 8.0;
                 coefF[2 * s * 8 + l] = static_cast<float>(-2.0 * r * std::cos(theta));
@@ -61,30 +63,26 @@ TEST(Kernels, GenericAndAvx2PathsAgree) {
             }
         }
         const std::vector<double> coefD(coefF.begin(), coefF.end()), gainD(8, 0.5),
-            pickD(pickF.begin(), pickF.end()), xd(in, in + 512), xd2(in - 8, in + 504);
+            zeroD(zeroF.begin(), zeroF.end()), xd(in, in + 512);
         std::vector<float> a(512 * 8), b(512 * 8);
         std::vector<float> sa = stateF, sb = stateF;
-        gen.lanesF[k - 1](in, in - 8, 512, a.data(), coefF.data(), gainF.data(), pickF.data(),
-                          sa.data());
-        avx2->lanesF[k - 1](in, in - 8, 512, b.data(), coefF.data(), gainF.data(), pickF.data(),
-                            sb.data());
+        gen.lanesF[k - 1](in, 512, a.data(), coefF.data(), gainF.data(), zeroF.data(), sa.data());
+        avx2->lanesF[k - 1](in, 512, b.data(), coefF.data(), gainF.data(), zeroF.data(), sb.data());
         expectClose(a, b, "float lanes ");
         // Unused lanes (gain zero, as SosLanes leaves them) read zero; the generic path skips
         // a part of them.
         std::fill(gainF.begin() + 4, gainF.end(), 0.0F);
-        gen.lanesF[k - 1](in, in - 8, 512, a.data(), coefF.data(), gainF.data(), pickF.data(),
-                          sa.data());
-        avx2->lanesF[k - 1](in, in - 8, 512, b.data(), coefF.data(), gainF.data(), pickF.data(),
-                            sb.data());
+        gen.lanesF[k - 1](in, 512, a.data(), coefF.data(), gainF.data(), zeroF.data(), sa.data());
+        avx2->lanesF[k - 1](in, 512, b.data(), coefF.data(), gainF.data(), zeroF.data(), sb.data());
         expectClose(a, b, "float lanes, four unused ");
         for (std::size_t i = 4; i < 512 * 8; i += (i % 8 == 7 ? 5 : 1)) {
             ASSERT_EQ(a[i], 0.0F) << i;
         }
         std::vector<double> da(2 * k * 8), db(2 * k * 8);
-        gen.lanesD[k - 1](xd.data(), xd2.data(), 512, a.data(), coefD.data(), gainD.data(),
-                          pickD.data(), da.data());
-        avx2->lanesD[k - 1](xd.data(), xd2.data(), 512, b.data(), coefD.data(), gainD.data(),
-                            pickD.data(), db.data());
+        gen.lanesD[k - 1](xd.data(), 512, a.data(), coefD.data(), gainD.data(), zeroD.data(),
+                          da.data());
+        avx2->lanesD[k - 1](xd.data(), 512, b.data(), coefD.data(), gainD.data(), zeroD.data(),
+                            db.data());
         expectClose(a, b, "double lanes ");
         // The band zeros (1 - z^-2)^k.
         std::vector<float> za(509), zb(509);
@@ -131,6 +129,53 @@ TEST(Cascades, OutputsDoNotDependOnHowTheSignalIsCut) {
     }
 }
 
+// Band-passes as lanes on one input with the zeros of the shortest lanes: a lane with one
+// section more adds its last pair of zeros itself. Each lane follows its cascade run on its
+// own, in float and double lanes.
+TEST(Lanes, EachLaneIsItsBandPass) {
+    const double fs = 24000.0;
+    auto bandpass = [&](int order, double f1, double f2) {
+        const double w1 = design::prewarp(f1, fs), w2 = design::prewarp(f2, fs);
+        return design::toSos(
+            design::bilinear(design::lowpassToBandpass(design::butterworthPrototype(order),
+                                                       std::sqrt(w1 * w2), w2 - w1),
+                             fs),
+            std::sqrt(f1 * f2), fs, 1.0);
+    };
+    const std::vector<SosList> bands = {bandpass(3, 900, 1130),
+                                        bandpass(4, 7000, 8800),
+                                        {},
+                                        bandpass(3, 3500, 4400),
+                                        bandpass(4, 9000, 11000)};
+    const std::vector<float> x = level_library_test::whiteNoise(4000, 3);
+    BandZeros zeros(3);
+    std::vector<float> uF(x.size());
+    std::vector<double> uD(x.size());
+    zeros.process(x.data(), x.size(), uF.data());
+    zeros.reset();
+    zeros.process(x.data(), x.size(), uD.data());
+    SosLanes<float> lanesF(bands);
+    SosLanes<double> lanesD(bands);
+    ASSERT_EQ(lanesF.order(), 3U);
+    std::vector<float> outF(x.size() * kLaneWidth), outD(x.size() * kLaneWidth);
+    lanesF.process(uF.data(), x.size(), outF.data());
+    lanesD.process(uD.data(), x.size(), outD.data());
+    for (std::size_t l = 0; l < kLaneWidth; ++l) {
+        std::vector<float> ref(x.size(), 0.0F);
+        if (l < bands.size() && !bands[l].empty()) {
+            SosCascade(bands[l]).process(x.data(), ref.data(), x.size());
+        }
+        float scale = 1e-30F;
+        for (float v : ref) scale = std::max(scale, std::fabs(v));
+        for (std::size_t i = 0; i < x.size(); ++i) {
+            ASSERT_NEAR(outF[i * kLaneWidth + l], ref[i], 2e-4F * scale) << "float lane " << l;
+            ASSERT_NEAR(outD[i * kLaneWidth + l], ref[i], 1e-5F * scale) << "double lane " << l;
+        }
+    }
+    EXPECT_THROW(SosLanes<float>({bandpass(2, 900, 1130), bandpass(4, 7000, 8800)}),
+                 std::invalid_argument);
+}
+
 // The statistics kernel on every path this processor has, against the definition in double
 // precision applied to band frames (from float and double lanes), four or eight lanes, the
 // frames in pieces of odd sizes: the kernel sums blocks of eight squares in float, within
@@ -140,13 +185,13 @@ TEST(Kernels, StatisticsFollowTheirDefinition) {
     const std::vector<float> x = level_library_test::whiteNoise(8 * 64 + 8, 7);
     const float* in = x.data() + 8;
     constexpr std::size_t kFrames = 300;
-    std::vector<float> coef(2 * 8), gain(8, 0.5F), pick(8, 0.0F);
+    std::vector<float> coef(2 * 8), gain(8, 0.5F);
     for (std::size_t l = 0; l < 8; ++l) {
         coef[l] = static_cast<float>(-1.8 * std::cos(0.1 + 0.05 * static_cast<double>(l)));
         coef[8 + l] = 0.81F;
     }
     const std::vector<double> coefD(coef.begin(), coef.end()), gainD(gain.begin(), gain.end()),
-        pickD(8, 0.0), xd(in, in + kFrames);
+        xd(in, in + kFrames);
     const double alpha = 0.01;
     double weights[9];
     float weightsF[8];
@@ -161,11 +206,11 @@ TEST(Kernels, StatisticsFollowTheirDefinition) {
             std::vector<float> stateF(16, 0.0F);
             std::vector<double> stateD(16, 0.0);
             if (precision == 0) {
-                table->lanesF[0](in, in, kFrames, frames.data(), coef.data(), gain.data(),
-                                 pick.data(), stateF.data());
+                table->lanesF[0](in, kFrames, frames.data(), coef.data(), gain.data(), nullptr,
+                                 stateF.data());
             } else {
-                table->lanesD[0](xd.data(), xd.data(), kFrames, frames.data(), coefD.data(),
-                                 gainD.data(), pickD.data(), stateD.data());
+                table->lanesD[0](xd.data(), kFrames, frames.data(), coefD.data(), gainD.data(),
+                                 nullptr, stateD.data());
             }
             float top = 0.0F;
             for (float v : frames) top = std::max(top, std::fabs(v));

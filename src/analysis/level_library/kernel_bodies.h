@@ -204,13 +204,11 @@ struct LaneVec;
 template <>
 struct LaneVec<float> {
     using V = V8f;
-    using Mask = V8i;
     static constexpr std::size_t kParts = 1;
 };
 template <>
 struct LaneVec<double> {
     using V = V4d;
-    using Mask = V4l;
     static constexpr std::size_t kParts = 2;
 };
 
@@ -373,17 +371,16 @@ ORV_KERNEL_TARGET void levels(const float* frames, std::size_t n, const LevelRun
 }
 #endif
 
-template <typename T, std::size_t K>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, const T* uHigh,
-                                                              std::size_t n, float* out,
+// Extra: some lanes have one section more than the zeros of the input: their last section
+// first applies the remaining (1 - z^-2) to its input, the previous section's output.
+template <typename T, std::size_t K, bool Extra>
+ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* u, std::size_t n, float* out,
                                                               const T* coef, const T* gain,
-                                                              const T* pick, T* state) {
+                                                              const T* zero, T* state) {
     using V = typename LaneVec<T>::V;
-    using Mask = typename LaneVec<T>::Mask;
     constexpr std::size_t P = LaneVec<T>::kParts;
     constexpr std::size_t L = 8 / P;  // lanes per part
-    V a1[K][P], a2[K][P], w1[K][P], w2[K][P], g[P];
-    Mask high[P];
+    V a1[K][P], a2[K][P], w1[K][P], w2[K][P], g[P], z[P] = {};
 #pragma GCC unroll 16
     for (std::size_t p = 0; p < P; ++p) {
 #pragma GCC unroll 16
@@ -394,20 +391,18 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
             __builtin_memcpy(&w2[k][p], state + (2 * k + 1) * 8 + p * L, sizeof(V));
         }
         __builtin_memcpy(&g[p], gain + p * L, sizeof(V));
-        V sel;
-        __builtin_memcpy(&sel, pick + p * L, sizeof(V));
-        high[p] = sel != 0;
+        if (Extra) __builtin_memcpy(&z[p], zero + p * L, sizeof(V));
     }
-    const bool mixed = uLow != uHigh;
     for (std::size_t i = 0; i < n; ++i) {
-        const V lo = uLow[i] - V{};  // broadcasts (x - 0 is x exactly)
-        const V hi = uHigh[i] - V{};
+        const V in = u[i] - V{};  // broadcast (x - 0 is x exactly)
 #pragma GCC unroll 16
         for (std::size_t p = 0; p < P; ++p) {
-            V x = lo;
-            if (mixed) ORV_SELECT(x, high[p], hi, lo);
+            V x = in;
+            V before = {};  // section K - 2's output two frames back
 #pragma GCC unroll 16
             for (std::size_t k = 0; k < K; ++k) {
+                if (Extra && k + 2 == K) before = w2[k][p];
+                if (Extra && k + 1 == K) x = x - z[p] * before;
                 // w[n-2] first: the recursion through w[n-1] is a single multiply-add.
                 const V t = x - a2[k][p] * w2[k][p];
                 const V w = t - a1[k][p] * w1[k][p];
@@ -436,10 +431,14 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* uLow, con
 }
 
 #if !defined(ORV_NARROW_KERNELS)
-#define ORV_LANES_ENTRY(NAME, T, K)                                                              \
-    ORV_KERNEL_TARGET void NAME(const T* lo, const T* hi, std::size_t n, float* out, const T* c, \
-                                const T* g, const T* pick, T* s) {                               \
-        lanesRun<T, K>(lo, hi, n, out, c, g, pick, s);                                           \
+#define ORV_LANES_ENTRY(NAME, T, K)                                                            \
+    ORV_KERNEL_TARGET void NAME(const T* u, std::size_t n, float* out, const T* c, const T* g, \
+                                const T* zero, T* s) {                                         \
+        if (zero != nullptr) {                                                                 \
+            lanesRun<T, K, true>(u, n, out, c, g, zero, s);                                    \
+        } else {                                                                               \
+            lanesRun<T, K, false>(u, n, out, c, g, zero, s);                                   \
+        }                                                                                      \
     }
 ORV_LANES_ENTRY(lanesF1, float, 1)
 ORV_LANES_ENTRY(lanesF2, float, 2)

@@ -49,24 +49,20 @@ struct NarrowVec;
 template <>
 struct NarrowVec<float> {
     using V = V4f;
-    using Mask = V4i;
 };
 template <>
 struct NarrowVec<double> {
     using V = V2d;
-    using Mask = V2l;
 };
 
 // Lanes of band filters (lanesRun), a part of 16 bytes at a time through all frames: four
 // float lanes or two double lanes. A part without filters (gain zero in every lane) reads
 // zero.
 template <typename T, std::size_t K>
-inline void lanesNarrow(const T* uLow, const T* uHigh, std::size_t n, float* out, const T* coef,
-                        const T* gain, const T* pick, T* state) {
+inline void lanesNarrow(const T* u, std::size_t n, float* out, const T* coef, const T* gain,
+                        const T* zero, T* state) {
     using V = typename NarrowVec<T>::V;
-    using Mask = typename NarrowVec<T>::Mask;
     constexpr std::size_t L = 16 / sizeof(T);  // lanes per part
-    const bool mixed = uLow != uHigh;
     for (std::size_t part = 0; part < 8 / L; ++part) {
         const std::size_t first = part * L;
         bool used = false;
@@ -77,7 +73,7 @@ inline void lanesNarrow(const T* uLow, const T* uHigh, std::size_t n, float* out
             }
             continue;
         }
-        V a1[K], a2[K], w1[K], w2[K], g, sel;
+        V a1[K], a2[K], w1[K], w2[K], g, z = {};
         for (std::size_t k = 0; k < K; ++k) {
             __builtin_memcpy(&a1[k], coef + (2 * k) * 8 + first, sizeof(V));
             __builtin_memcpy(&a2[k], coef + (2 * k + 1) * 8 + first, sizeof(V));
@@ -85,19 +81,14 @@ inline void lanesNarrow(const T* uLow, const T* uHigh, std::size_t n, float* out
             __builtin_memcpy(&w2[k], state + (2 * k + 1) * 8 + first, sizeof(V));
         }
         __builtin_memcpy(&g, gain + first, sizeof g);
-        __builtin_memcpy(&sel, pick + first, sizeof sel);
-        const Mask high = sel != 0;
+        const bool extra = zero != nullptr;
+        if (extra) __builtin_memcpy(&z, zero + first, sizeof z);
         for (std::size_t i = 0; i < n; ++i) {
-            V x = uLow[i] - V{};
-            if (mixed) {
-                const V hi = uHigh[i] - V{};
-                Mask bl, bh;
-                __builtin_memcpy(&bl, &x, sizeof bl);
-                __builtin_memcpy(&bh, &hi, sizeof bh);
-                bl = (bh & high) | (bl & ~high);
-                __builtin_memcpy(&x, &bl, sizeof x);
-            }
+            V x = u[i] - V{};
+            V before = {};
             for (std::size_t k = 0; k < K; ++k) {
+                if (extra && k + 2 == K) before = w2[k];
+                if (extra && k + 1 == K) x = x - z * before;
                 const V t = x - a2[k] * w2[k];
                 const V w = t - a1[k] * w1[k];
                 w2[k] = w1[k];
@@ -119,10 +110,10 @@ inline void lanesNarrow(const T* uLow, const T* uHigh, std::size_t n, float* out
     }
 }
 
-#define ORV_NARROW_LANES(NAME, T, K)                                                       \
-    void NAME(const T* lo, const T* hi, std::size_t n, float* out, const T* c, const T* g, \
-              const T* pick, T* s) {                                                       \
-        lanesNarrow<T, K>(lo, hi, n, out, c, g, pick, s);                                  \
+#define ORV_NARROW_LANES(NAME, T, K)                                                        \
+    void NAME(const T* u, std::size_t n, float* out, const T* c, const T* g, const T* zero, \
+              T* s) {                                                                       \
+        lanesNarrow<T, K>(u, n, out, c, g, zero, s);                                        \
     }
 ORV_NARROW_LANES(lanesNarrowF1, float, 1)
 ORV_NARROW_LANES(lanesNarrowF2, float, 2)

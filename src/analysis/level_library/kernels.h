@@ -75,13 +75,14 @@ struct KernelTable {
     // iirDecimate in single precision, any order (state: eight floats).
     void (*iirDecimateF)(const IirBlockPlan& plan, float* state, const float* in,
                          std::size_t blocks, float* out);
-    // n frames of eight lanes: lane l reads uLow or, where pick[l] != 0, uHigh; then the
-    // all-pole sections (coef: per section a1[8], a2[8]; state: per section w1[8], w2[8]) and
-    // the gain (gain[8]). Indexed by the number of sections - 1.
-    void (*lanesF[4])(const float* uLow, const float* uHigh, std::size_t n, float* out,
-                      const float* coef, const float* gain, const float* pick, float* state);
-    void (*lanesD[4])(const double* uLow, const double* uHigh, std::size_t n, float* out,
-                      const double* coef, const double* gain, const double* pick, double* state);
+    // n frames of eight lanes on one input u: all-pole sections (coef: per section a1[8],
+    // a2[8]; state: per section w1[8], w2[8]) and the gain (gain[8]); lanes with zero[l] = 1
+    // apply (1 - z^-2) to the input of their last section (zero null: none; at least two
+    // sections where given). Indexed by the number of sections - 1.
+    void (*lanesF[4])(const float* u, std::size_t n, float* out, const float* coef,
+                      const float* gain, const float* zero, float* state);
+    void (*lanesD[4])(const double* u, std::size_t n, float* out, const double* coef,
+                      const double* gain, const double* zero, double* state);
     // (1 - z^-2)^order of x (x[-8] .. x[-1] readable), n outputs; indexed by order - 1.
     void (*zerosF[4])(const float* x, std::size_t n, float* out);
     void (*zerosD[4])(const float* x, std::size_t n, double* out);

@@ -107,12 +107,12 @@ private:
     struct Design;
     static const Design& design(Bank bank);
 
-    // The zeros of a stage's bands (BandZeros of the orders its lanes read) and their
-    // outputs for one chunk.
+    // The zeros of a stage's bands (BandZeros of the order its lanes read) and their output
+    // for one chunk.
     struct StageZeros {
-        BandZeros low, high;
-        std::vector<float> lowF, highF;
-        std::vector<double> lowD, highD;
+        BandZeros zeros;
+        std::vector<float> outF;
+        std::vector<double> outD;
     };
 
     Bank bank_;

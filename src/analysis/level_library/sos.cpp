@@ -182,7 +182,7 @@ SosLanes<T>::SosLanes(const std::vector<SosList>& sos) {
     if (sections_ > kMaxSections) throw std::invalid_argument("too many sections for a lane");
     coef_.assign(sections_ * 2 * kLaneWidth, T{});
     gain_.assign(kLaneWidth, T{});
-    pick_.assign(kLaneWidth, T{});
+    zero_.assign(kLaneWidth, T{});
     state_.assign(sections_ * 2 * kLaneWidth, T{});
     std::vector<unsigned> orders;
     for (std::size_t l = 0; l < kLaneWidth && l < sos.size(); ++l) {
@@ -217,16 +217,17 @@ SosLanes<T>::SosLanes(const std::vector<SosList>& sos) {
         }
         gain_[l] = static_cast<T>(gain);
         orders.push_back(n);
-        pick_[l] = static_cast<T>(n);  // resolved below
+        zero_[l] = static_cast<T>(n);  // resolved below
     }
     if (orders.empty()) return;
-    low_ = *std::min_element(orders.begin(), orders.end());
-    high_ = *std::max_element(orders.begin(), orders.end());
-    for (const unsigned n : orders) {
-        if (n != low_ && n != high_) throw std::invalid_argument("lanes of three zero orders");
+    order_ = *std::min_element(orders.begin(), orders.end());
+    const unsigned most = *std::max_element(orders.begin(), orders.end());
+    if (most > order_ + 1) {
+        throw std::invalid_argument("lanes whose numbers of sections differ by more than one");
     }
+    extra_ = most != order_;
     for (std::size_t l = 0; l < kLaneWidth; ++l) {
-        pick_[l] = pick_[l] == static_cast<T>(high_) && high_ != low_ ? T{1} : T{0};
+        zero_[l] = extra_ && zero_[l] == static_cast<T>(most) ? T{1} : T{0};
     }
 }
 
@@ -236,18 +237,18 @@ void SosLanes<T>::reset() {
 }
 
 template <typename T>
-void SosLanes<T>::process(const T* uLow, const T* uHigh, std::size_t n, float* out) {
+void SosLanes<T>::process(const T* u, std::size_t n, float* out) {
     if (sections_ == 0) {
         std::fill(out, out + n * kLaneWidth, 0.0F);
         return;
     }
     const KernelTable& k = kernels();
     if constexpr (std::is_same_v<T, float>) {
-        k.lanesF[sections_ - 1](uLow, uHigh, n, out, coef_.data(), gain_.data(), pick_.data(),
-                                state_.data());
+        k.lanesF[sections_ - 1](u, n, out, coef_.data(), gain_.data(),
+                                extra_ ? zero_.data() : nullptr, state_.data());
     } else {
-        k.lanesD[sections_ - 1](uLow, uHigh, n, out, coef_.data(), gain_.data(), pick_.data(),
-                                state_.data());
+        k.lanesD[sections_ - 1](u, n, out, coef_.data(), gain_.data(),
+                                extra_ ? zero_.data() : nullptr, state_.data());
     }
 }
 

@@ -90,8 +90,10 @@ private:
 // is one band. A band-pass of n sections has the zeros (1 - z^-2)^n, which BandZeros applies
 // once for every lane: the lanes then run all-pole sections (two multiply-adds per section
 // and sample, one of them on the recursion) and their gain. Lanes with fewer sections than
-// others get pass-through sections; lanes may need two different zero orders (`low` and
-// `high`, each lane picks one).
+// others get pass-through sections. The input holds the zeros of the lanes with the fewest
+// sections; lanes with one section more apply their last (1 - z^-2) themselves, to the input
+// of their last section (the bands next to a stage's Nyquist frequency, where that pair
+// costs no precision).
 inline constexpr std::size_t kLaneWidth = 8;
 
 template <typename T>
@@ -102,25 +104,25 @@ public:
     SosLanes() = default;
     // sos[l] is the cascade of lane l (empty for an unused lane, which reads 0); at most
     // kMaxSections sections per lane, each lane's numerator a multiple of (1 - z^-2)^n with
-    // n its number of sections (throws std::invalid_argument otherwise).
+    // n its number of sections, and the numbers of sections of the lanes at most one apart
+    // (throws std::invalid_argument otherwise).
     explicit SosLanes(const std::vector<SosList>& sos);
 
     void reset();
-    // Zero orders the lanes read (equal when every lane reads the same).
-    unsigned lowOrder() const { return low_; }
-    unsigned highOrder() const { return high_; }
-    // uLow / uHigh: the band signal through BandZeros of lowOrder / highOrder; out receives
-    // n frames of kLaneWidth floats (lane-interleaved).
-    void process(const T* uLow, const T* uHigh, std::size_t n, float* out);
+    // The zero order of the input (the fewest sections of a lane).
+    unsigned order() const { return order_; }
+    // u: the band signal through BandZeros of order(); out receives n frames of kLaneWidth
+    // floats (lane-interleaved).
+    void process(const T* u, std::size_t n, float* out);
     std::size_t sections() const { return sections_; }
 
 private:
     std::size_t sections_ = 0;
-    unsigned low_ = 0;
-    unsigned high_ = 0;
+    unsigned order_ = 0;
     std::vector<T> coef_;   // [section][a1 a2][lane]
     std::vector<T> gain_;   // [lane]
-    std::vector<T> pick_;   // [lane]: 1 where the lane reads the high order
+    std::vector<T> zero_;   // [lane]: 1 where the last section adds a pair of zeros
+    bool extra_ = false;    // some lane does
     std::vector<T> state_;  // [section][w1 w2][lane]
 };
 
