@@ -16,6 +16,9 @@
 //   input that already holds their zeros (see sos.h), float or double;
 // - levels: squares, energy, exponential time weighting and its extremes of four or eight
 //   lanes, and where the magnitudes reach thresholds for the peak search (band_levels.h).
+// The generic table takes its lanes, statistics and single-precision decimation from
+// kernel_narrow.h, written for its 16-byte registers; the rest of both tables comes from
+// kernel_bodies.h.
 #pragma once
 
 #include <cstddef>

@@ -20,15 +20,14 @@ IirBlockPlan makeIirBlockPlan(const SosList& sos);
 
 // One signal through a cascade of up to four sections, double precision (used where poles
 // sit close to z = 1 at the full rate: frequency weighting, filtered channel), or for
-// decimation in single precision (anti-alias filters). The cascade runs in blocks of
-// sixteen samples counted from reset: each block is
-// one state-space step (the state of the sections' transposed direct form II at the block
-// start, times fixed matrices, plus the block's inputs times fixed matrices, computed once
-// from the sections), which turns a chain of dependent multiply-adds per sample into
-// independent vector operations. The outputs of a block that a call leaves unfinished come
-// from the same step with its missing inputs zero (they do not reach earlier outputs), and
-// the block is finished by the next call: results do not depend on how the signal is cut
-// into calls.
+// decimation in single precision (anti-alias filters). The cascade runs in blocks of sixteen
+// samples counted from reset: each block is one state-space step (the state of the
+// sections' transposed direct form II at the block start, times fixed matrices, plus the
+// block's inputs times fixed matrices, computed once from the sections), which turns a chain
+// of dependent multiply-adds per sample into independent vector operations. The outputs of
+// a block that a call leaves unfinished come from the same step with its missing inputs
+// zero (they do not reach earlier outputs), and the block is finished by the next call:
+// results do not depend on how the signal is cut into calls.
 class SosCascade {
 public:
     enum class Precision { Double, Single };
