@@ -9,15 +9,14 @@
 #include <thread>
 #include <utility>
 
+#include "kernels.h"
+
 namespace platform {
 
 int vectorKernelStartup() {
-#if defined(__x86_64__) || defined(__i386__)
-    __builtin_cpu_init();
-    return __builtin_cpu_supports("avx2") ? 0 : kGenericCodePathStatus;
-#else
-    return 0;
-#endif
+    // The level library's own choice (AVX2 with FMA, and a build that has those kernels),
+    // so that the status names the code path that actually runs.
+    return SlmLibrary::avx2Kernels() != nullptr ? 0 : kGenericCodePathStatus;
 }
 
 unsigned logicalProcessorCount() {

@@ -5,8 +5,9 @@
 
 namespace platform {
 
-// Start-up of the vector kernels: 0 when the optimised code path is usable, 20 when the
-// processor lacks the instructions it needs and the generic path was chosen.
+// Start-up of the vector kernels: 0 when the level library runs its optimised code path, 20
+// when it runs the generic one (the processor lacks AVX2 or FMA, or the build has only the
+// generic kernels).
 inline constexpr int kGenericCodePathStatus = 20;
 int vectorKernelStartup();
 

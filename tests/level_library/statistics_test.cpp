@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <vector>
 
@@ -88,6 +89,39 @@ TEST(LevelDistribution, LnIsTheClassReachedOrExceededByNPercent) {
     }
 
     EXPECT_EQ(LevelHistogram().exceedanceLevel(50.0), 0.0F);
+}
+
+// addPower finds classes mostly without a logarithm: it must put every power where
+// add(powerToDb) does, at class edges too (levels k.k5 dB, just below and above), across the
+// range and beyond it, and for powers with no level.
+TEST(LevelDistribution, PowersLandInTheClassOfTheirLevel) {
+    std::vector<double> powers = {0.0,
+                                  -1.0,
+                                  1e-310,
+                                  1e-300,
+                                  1e300,
+                                  std::numeric_limits<double>::infinity(),
+                                  std::numeric_limits<double>::quiet_NaN()};
+    for (int k = -1005; k <= 2505; ++k) {
+        const double edge = std::pow(10.0, (k + 0.5) / 100.0);
+        for (double f : {1.0 - 1e-6, 1.0 - 1e-12, 1.0, 1.0 + 1e-12, 1.0 + 1e-6, 1.0 + 0.01}) {
+            powers.push_back(edge * f);
+        }
+    }
+    std::uint32_t seed = 99;
+    for (int i = 0; i < 20000; ++i) {
+        seed = seed * 1664525U + 1013904223U;
+        powers.push_back(std::pow(10.0, -12.0 + 30.0 * static_cast<double>(seed) / 4294967296.0));
+    }
+    LevelHistogram byLevel, byPower;
+    for (const double p : powers) {
+        byLevel.reset();
+        byPower.reset();
+        byLevel.add(Dsp::powerToDb(p));
+        byPower.addPower(p);
+        ASSERT_EQ(byPower.count(), 1U);
+        ASSERT_EQ(byPower.exceedanceLevel(50.0), byLevel.exceedanceLevel(50.0)) << p;
+    }
 }
 
 TEST(IntervalStatistics, ReportsLeqExtremesAndPercentilesOfTheEnteredLevels) {

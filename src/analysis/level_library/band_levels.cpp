@@ -14,9 +14,13 @@ namespace SlmLibrary {
 namespace {
 
 // Lanczos (a = 4) interpolation at quarter-sample offsets t = 0.25, 0.5, 0.75 from the
-// sample at tap 3 of eight consecutive samples; each kernel sums to one.
+// sample at tap 3 of eight consecutive samples; each kernel sums to one. For the six values
+// around a sample j (after j - 1 and after j) from the nine samples j - 4 .. j + 4 at once:
+// column m holds the weight of sample m in value 3 b + t (b = 0: around j - 1), zero where
+// the sample is not one of its taps, so each value sums its taps in order as h would.
 struct QuarterKernels {
     float h[3][8];
+    alignas(16) float columns[9][8];
 };
 
 QuarterKernels makeQuarterKernels() {
@@ -34,6 +38,14 @@ QuarterKernels makeQuarterKernels() {
             sum += taps[i];
         }
         for (int i = 0; i < 8; ++i) k.h[t][i] = static_cast<float>(taps[i] / sum);
+    }
+    for (int m = 0; m < 9; ++m) {
+        for (int b = 0; b < 2; ++b) {
+            for (int t = 0; t < 3; ++t) {
+                const int i = m - b;
+                k.columns[m][3 * b + t] = i >= 0 && i < 8 ? k.h[t][i] : 0.0F;
+            }
+        }
     }
     return k;
 }
@@ -53,6 +65,13 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
     tickSamples_ = static_cast<std::size_t>(std::lround(0.01 * inputRate / factor));
     periodSamples_ = static_cast<std::size_t>(std::lround(0.1 * inputRate / factor));
     if (code_ != TWeight::N) alpha_ = -std::expm1(-1.0 / (TWeight::timeConstant(code_) * rate));
+    double decay = 1.0;
+    for (std::size_t j = 8; j-- > 0;) {
+        weights_[j] = alpha_ * decay;
+        decay *= 1.0 - alpha_;
+    }
+    weights_[8] = decay;
+    for (std::size_t j = 0; j < 8; ++j) weightsF_[j] = static_cast<float>(weights_[j]);
     lowHalfOnly_ = true;
     for (std::size_t l = 0; l < W; ++l) {
         if (l >= 4 && lanes[l].active) lowHalfOnly_ = false;
@@ -66,6 +85,7 @@ BandLevels<W>::BandLevels(unsigned twCode, double rate, double inputRate,
                 : static_cast<std::uint64_t>(std::ceil(lanes[l].primeSeconds * rate));
         primeEnd_[l] = settleEnd_[l] + prime;
     }
+    candidates_.resize(256);  // calls of several hundred frames without allocation
     histogram_.reserve(W);
     for (std::size_t l = 0; l < W; ++l) {
         histogram_.emplace_back(active_[l] ? LevelHistogram() : LevelHistogram(0.0F, 0.0F));
@@ -115,9 +135,9 @@ void BandLevels<W>::resetStatistics() {
 
 template <std::size_t W>
 void BandLevels<W>::tick() {
-    for (std::size_t l = 0; l < W; ++l) {
-        if (active_[l] && primed_[l]) histogram_[l].add(Dsp::powerToDb(tw_[l]));
-    }
+    std::array<bool, W> take{};
+    for (std::size_t l = 0; l < W; ++l) take[l] = active_[l] && primed_[l];
+    LevelHistogram::addPowers(histogram_.data(), tw_.data(), take.data(), W);
 }
 
 template <std::size_t W>
@@ -157,17 +177,33 @@ void BandLevels<W>::finishPriming(std::size_t l) {
 template <std::size_t W>
 void BandLevels<W>::processFast(const float* frames, std::size_t count) {
     std::array<float, W> magnitude{};  // largest magnitude per lane in this call
-    const LevelRun run{energy_.data(), tw_.data(),       max_.data(),
-                       min_.data(),    magnitude.data(), alpha_};
+    // The peak search looks at no sample below 0.7 of the lane's peak so far: the kernel lists
+    // the stretches of frames that reach it.
+    std::array<float, W> reach{};
+    for (std::size_t l = 0; l < W; ++l) {
+        reach[l] = interpolate_[l] ? 0.7F * std::max(truePeak_[l], peak_[l])
+                                   : std::numeric_limits<float>::infinity();
+    }
+    const std::size_t room = 2 * (count / 8 + count / tickSamples_ + 2);
+    if (candidates_.size() < room) candidates_.resize(room);
+    candidateCount_ = 0;
     // Groups whose lanes 4..7 are unused need half the work.
-    auto* const kernel =
-        kernels().levels4 == nullptr || !lowHalfOnly_ ? kernels().levels8 : kernels().levels4;
+    LevelRun run{energy_.data(),     tw_.data(),       max_.data(),
+                 min_.data(),        magnitude.data(), alpha_,
+                 weights_.data(),    weightsF_.data(), reach.data(),
+                 candidates_.data(), &candidateCount_, lowHalfOnly_ ? 4U : 8U};
     std::size_t i = 0;
     while (i < count) {
         const std::size_t n = std::min(count - i, tickSamples_ - tickPhase_);
         const float* f = frames + i * W;
         if constexpr (W == 8) {
-            kernel(f, n, run);
+            const std::size_t before = candidateCount_;
+            run.candidates = candidates_.data() + 2 * before;
+            std::size_t added = 0;
+            run.candidateCount = &added;
+            kernels().levels(f, n, run);
+            for (std::size_t c = 0; c < added; ++c) candidates_[2 * (before + c)] += i;
+            candidateCount_ = before + added;
         } else {
             const double a = alpha_;
             for (std::size_t k = 0; k < n; ++k) {
@@ -202,7 +238,7 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
     // Frames -8 .. -1 from the previous call (tail_), then this call's. A sample is
     // interpolated once four frames after it are known; the last four wait for the next call.
     const std::size_t total = kHistory + count;
-    const std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
+    std::size_t begin = tailSettled_ ? kHistory - 4 : kHistory;
     const std::size_t end = total - 4;
     const QuarterKernels& k = quarterKernels();
     auto x = [&](std::size_t j, std::size_t l) {
@@ -217,28 +253,49 @@ void BandLevels<W>::refinePeaks(const float* frames, std::size_t count,
         threshold[l] = interpolate_[l] ? 0.7F * best[l] : std::numeric_limits<float>::infinity();
     }
     auto interpolateAround = [&](std::size_t j, std::size_t l) {
-        for (std::size_t base = j - 1; base <= j; ++base) {
-            for (int t = 0; t < 3; ++t) {
-                float s = 0.0F;
-                for (std::size_t i = 0; i < 8; ++i) s += k.h[t][i] * x(base - 3 + i, l);
-                best[l] = std::max(best[l], std::fabs(s));
+        using V4f = float __attribute__((vector_size(16)));
+        V4f s[2] = {};
+        for (std::size_t m = 0; m < 9; ++m) {
+            const float w = x(j - 4 + m, l);
+            for (std::size_t h = 0; h < 2; ++h) {
+                V4f c;
+                std::memcpy(&c, &k.columns[m][4 * h], sizeof c);
+                s[h] += c * w;
             }
         }
+        for (std::size_t i = 0; i < 6; ++i) best[l] = std::max(best[l], std::fabs(s[i / 4][i % 4]));
         best[l] = std::max(best[l], std::fabs(x(j, l)));
         threshold[l] = 0.7F * best[l];
     };
     // Only lanes whose largest magnitude reaches the threshold need a look at the frames:
     // the call's own frames (measured by the statistics kernel) and the ones waiting from
-    // the previous call.
+    // the previous call. Each lane sees its frames in order, the threshold rising as crests
+    // are found.
     std::array<float, W> largest = magnitude;
     for (std::size_t j = begin; j < kHistory; ++j) {
         for (std::size_t l = 0; l < W; ++l) largest[l] = std::max(largest[l], std::fabs(x(j, l)));
     }
-    for (std::size_t l = 0; l < W; ++l) {
-        if (!interpolate_[l] || largest[l] < threshold[l]) continue;
-        for (std::size_t j = begin; j < end; ++j) {
+    bool any = false;
+    for (std::size_t l = 0; l < W; ++l)
+        any = any || (interpolate_[l] && largest[l] >= threshold[l]);
+    if (!any) begin = end;
+    auto visit = [&](std::size_t j) {
+        for (std::size_t l = 0; l < W; ++l) {
             if (std::fabs(x(j, l)) >= threshold[l]) interpolateAround(j, l);
         }
+    };
+    std::size_t j = begin;
+    for (; j < std::min(end, kHistory); ++j) visit(j);
+    if constexpr (W == 8) {
+        // The call's frames: only the stretches the statistics kernel found reaching the
+        // threshold the call started with (the threshold only rises).
+        for (std::size_t c = 0; c < candidateCount_ && j < end; ++c) {
+            const std::size_t first = kHistory + candidates_[2 * c];
+            const std::size_t last = std::min(end, first + candidates_[2 * c + 1]);
+            for (j = std::max(j, first); j < last; ++j) visit(j);
+        }
+    } else {
+        for (; j < end; ++j) visit(j);
     }
     for (std::size_t l = 0; l < W; ++l) {
         if (interpolate_[l]) truePeak_[l] = best[l];
@@ -295,7 +352,7 @@ void BandLevels<W>::processSlow(const float* frames, std::size_t count, bool ent
                         max_[l] = std::max(max_[l], level);
                         min_[l] = std::min(min_[l], level);
                         hasExtremes_[l] = true;
-                        histogram_[l].add(Dsp::powerToDb(level));
+                        histogram_[l].addPower(level);
                     }
                     periodSum_[l] = 0.0;
                 }

@@ -89,6 +89,8 @@ private:
     unsigned code_ = 0;
     double rate_ = 1.0;
     double alpha_ = 0.0;
+    std::array<double, 9> weights_{};  // of eight frames (LevelRun)
+    std::array<float, 8> weightsF_{};
     std::size_t tickSamples_ = 1;    // 10 ms
     std::size_t periodSamples_ = 1;  // 100 ms (N)
     std::array<bool, W> active_{};
@@ -118,6 +120,9 @@ private:
     std::array<double, W> min_{};
     std::array<bool, W> hasExtremes_{};
     std::array<float, W> truePeak_{};
+    // Stretches of a call's frames for the peak search: first, count (LevelRun).
+    std::vector<std::uint32_t> candidates_;
+    std::size_t candidateCount_ = 0;
     std::vector<LevelHistogram> histogram_;
     // Last frames of the previous call (for interpolation across calls).
     static constexpr std::size_t kHistory = 8;

@@ -134,8 +134,7 @@ WeightingDesign makeDesign(double fs) {
     return d;
 }
 
-SosList cascadeFor(unsigned code, double fs) {
-    const WeightingDesign d = makeDesign(fs);
+SosList cascadeFor(unsigned code, const WeightingDesign& d) {
     SosList all;
     if (code == FWeight::Z) return all;
     all = d.shared;
@@ -143,6 +142,8 @@ SosList cascadeFor(unsigned code, double fs) {
     all.insert(all.end(), tail.begin(), tail.end());
     return all;
 }
+
+SosList cascadeFor(unsigned code, double fs) { return cascadeFor(code, makeDesign(fs)); }
 
 }  // namespace
 
@@ -159,15 +160,13 @@ void FWeight::init(unsigned code, double sampleRate) {
     fs_ = sampleRate;
     // A few hundred complex evaluations: cheap enough to design per init.
     const WeightingDesign d = makeDesign(fs_);
-    shared_ = SosCascade(d.shared);
-    aTail_ = SosCascade(d.aTail);
-    cTail_ = SosCascade(d.cTail);
+    a_ = SosCascade(cascadeFor(A, d));
+    c_ = SosCascade(cascadeFor(C, d));
 }
 
 void FWeight::reset() {
-    shared_.reset();
-    aTail_.reset();
-    cTail_.reset();
+    a_.reset();
+    c_.reset();
 }
 
 void FWeight::Process(const float* in, float* out, std::size_t n) {
@@ -177,25 +176,22 @@ void FWeight::Process(const float* in, float* out, std::size_t n) {
         }
         return;
     }
-    // Block passes; the float intermediate between the two cascades costs nothing
-    // measurable (24-bit mantissa, far below the weighting's tolerance).
-    shared_.process(in, out, n);
-    (code_ == C ? cTail_ : aTail_).process(out, out, n);
+    (code_ == C ? c_ : a_).process(in, out, n);
 }
 
 int FWeight::ProcessAll(const float* in, float* outZ, float* outC, float* outA, std::size_t n) {
-    // Same block passes as Process, so each output equals the single weighting's.
+    // The cascades of Process, so each output equals the single weighting's; through
+    // pieces of its own, as an output may be the input.
     constexpr std::size_t kPiece = 256;
-    float common[kPiece];
+    float a[kPiece];
     float c[kPiece];
     for (std::size_t pos = 0; pos < n; pos += kPiece) {
         const std::size_t m = std::min(kPiece, n - pos);
-        shared_.process(in + pos, common, m);
-        cTail_.process(common, c, m);
-        aTail_.process(common, common, m);
+        c_.process(in + pos, c, m);
+        a_.process(in + pos, a, m);
         if (outZ != nullptr && outZ != in) std::copy(in + pos, in + pos + m, outZ + pos);
         if (outC != nullptr) std::copy(c, c + m, outC + pos);
-        if (outA != nullptr) std::copy(common, common + m, outA + pos);
+        if (outA != nullptr) std::copy(a, a + m, outA + pos);
     }
     return 1;
 }

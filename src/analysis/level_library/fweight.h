@@ -59,9 +59,11 @@ public:
 private:
     unsigned code_ = Z;
     double fs_;
-    SosCascade shared_;  // 20.6 Hz double pole with two zeros at 0 Hz: common to A and C
-    SosCascade aTail_;   // 107.7 Hz, 737.9 Hz and 12194 Hz poles
-    SosCascade cTail_;   // 12194 Hz poles
+    // Each weighting as one cascade (one pass, the whole filter in double precision): the
+    // 20.6 Hz double pole with two zeros at 0 Hz, then for A the 107.7 Hz, 737.9 Hz and
+    // 12194 Hz poles, for C the 12194 Hz poles.
+    SosCascade a_;
+    SosCascade c_;
 };
 
 }  // namespace SlmLibrary

@@ -11,6 +11,7 @@ typedef float V4f __attribute__((vector_size(16)));
 typedef long long V4l __attribute__((vector_size(32)));
 typedef int V4i __attribute__((vector_size(16)));
 typedef int V8i __attribute__((vector_size(32)));
+typedef long long V2l __attribute__((vector_size(16)));
 
 // Lane-wise select and element broadcast. AVX: the vector forms, one instruction each.
 // Generic (vectors of two SSE registers): bit operations, which stay vector code.
@@ -47,8 +48,32 @@ constexpr bool kIirBlocks = false;
 #define ORV_KERNEL_TARGET
 #define ORV_SELECT ORV_SELECT_BITS
 #define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
+#define ORV_BROADCAST_LOAD(out, p) ((out) = *(p)-V4d{})
+#define ORV_BROADCAST_F(out, v, k) ((out) = (v)[k] - V8f{})
+#define ORV_ALL_SET(v) (((v)[0] & (v)[1] & (v)[2] & (v)[3]) == -1)
+#define ORV_WIDEN(out, v) ((out) = __builtin_convertvector((v), V4d))
+#define ORV_NARROW(out, v) ((out) = __builtin_convertvector((v), V4f))
+#define ORV_NARROW_KERNELS
 #include "kernel_bodies.h"
+#include "kernel_narrow.h"
+#undef ORV_NARROW_KERNELS
+const KernelTable kTable = {
+    kTableName,
+    {iir2, iir4, iir6, iir8},
+    {decimate2, decimate4, decimate6, decimate8},
+    decimateNarrow,
+    {lanesNarrowF1, lanesNarrowF2, lanesNarrowF3, lanesNarrowF4},
+    {lanesNarrowD1, lanesNarrowD2, lanesNarrowD3, lanesNarrowD4},
+    {zerosF1, zerosF2, zerosF3, zerosF4},
+    {zerosD1, zerosD2, zerosD3, zerosD4},
+    levelsNarrowEntry,
+};
 #undef ORV_KERNEL_TARGET
+#undef ORV_BROADCAST_LOAD
+#undef ORV_BROADCAST_F
+#undef ORV_ALL_SET
+#undef ORV_WIDEN
+#undef ORV_NARROW
 #undef ORV_SELECT
 #undef ORV_BROADCAST
 #undef ORV_MAX_D
@@ -72,15 +97,32 @@ constexpr bool kIirBlocks = true;
 #define ORV_KERNEL_TARGET __attribute__((target("avx2,fma"), optimize("fp-contract=fast")))
 #endif
 #define ORV_SELECT ORV_SELECT_VECTOR
-#if defined(__clang__)
-#define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
-#else
 #define ORV_BROADCAST(v, k)                                                        \
     __builtin_shuffle(v, V4l{static_cast<long long>(k), static_cast<long long>(k), \
                              static_cast<long long>(k), static_cast<long long>(k)})
-#endif
+#define ORV_BROADCAST_LOAD(out, p) ((out) = __builtin_ia32_vbroadcastsd256(p))
+#define ORV_BROADCAST_F(out, v, k) ((out) = __builtin_shuffle((v), V8i{} + static_cast<int>(k)))
+#define ORV_ALL_SET(v) (__builtin_ia32_movmskpd256(reinterpret_cast<V4d>(v)) == 0xf)
+#define ORV_WIDEN(out, v) ((out) = __builtin_ia32_cvtps2pd256(v))
+#define ORV_NARROW(out, v) ((out) = __builtin_ia32_cvtpd2ps256(v))
 #include "kernel_bodies.h"
+const KernelTable kTable = {
+    kTableName,
+    {iir2, iir4, iir6, iir8},
+    {decimate2, decimate4, decimate6, decimate8},
+    decimateF,
+    {lanesF1, lanesF2, lanesF3, lanesF4},
+    {lanesD1, lanesD2, lanesD3, lanesD4},
+    {zerosF1, zerosF2, zerosF3, zerosF4},
+    {zerosD1, zerosD2, zerosD3, zerosD4},
+    levels,
+};
 #undef ORV_KERNEL_TARGET
+#undef ORV_BROADCAST_LOAD
+#undef ORV_BROADCAST_F
+#undef ORV_ALL_SET
+#undef ORV_WIDEN
+#undef ORV_NARROW
 #undef ORV_SELECT
 #undef ORV_BROADCAST
 #undef ORV_MAX_D

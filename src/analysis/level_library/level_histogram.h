@@ -14,6 +14,14 @@ public:
     explicit LevelHistogram(float minDb = -100.0F, float maxDb = 250.0F);
 
     void add(float db);
+    // The same as add(Dsp::powerToDb(power)) for the classes and the count, mostly without a
+    // logarithm. minimum() and maximum() are kept by add only: a histogram is fed by one of
+    // the two.
+    void addPower(double power);
+    // addPower(powers[i]) on histograms[i] for every i < n with take[i]: the levels of
+    // several histograms at once, which is faster than one after the other.
+    static void addPowers(LevelHistogram* histograms, const double* powers, const bool* take,
+                          std::size_t n);
     void reset();
 
     std::uint64_t count() const { return count_; }
@@ -29,6 +37,8 @@ public:
 
 private:
     std::size_t classOf(float db) const;
+    // addPower, with quick the power's level in tenths of a dB (within 1e-8).
+    void addPower(double power, double quick);
     float levelOfClass(std::size_t index) const;
 
     int firstClass_;  // class index of the lowest class, in tenths of a dB

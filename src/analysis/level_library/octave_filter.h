@@ -13,8 +13,10 @@
 // 0.25 fs) and a decimation by two then give the next stage, 24000 Hz, for the next octave,
 // and so on down to 1500 Hz, where all bands below 355 Hz are computed (each stage's bands
 // lie below 0.237 of its rate). Aliased components are therefore at least 80 dB down, below
-// every class 1 stop-band limit. Bands at 48000..3000 Hz run in single precision, the
-// 1500 Hz stage in double precision; bands of a stage are computed side by side as lanes.
+// every class 1 stop-band limit. The anti-alias filters and the bands at 48000..3000 Hz run
+// in single precision (their rounding noise stays more than 150 dB below a tone), the bands
+// of the 1500 Hz stage in double precision; bands of a stage are computed side by side as
+// lanes.
 //
 // Band outputs come at their stage rate: 48000 / 2^s, s = 0..5.
 #pragma once
@@ -105,12 +107,12 @@ private:
     struct Design;
     static const Design& design(Bank bank);
 
-    // The zeros of a stage's bands (BandZeros of the orders its lanes read) and their
-    // outputs for one chunk.
+    // The zeros of a stage's bands (BandZeros of the order its lanes read) and their output
+    // for one chunk.
     struct StageZeros {
-        BandZeros low, high;
-        std::vector<float> lowF, highF;
-        std::vector<double> lowD, highD;
+        BandZeros zeros;
+        std::vector<float> outF;
+        std::vector<double> outD;
     };
 
     Bank bank_;

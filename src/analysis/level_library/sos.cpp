@@ -48,24 +48,37 @@ IirBlockPlan makeIirBlockPlan(const SosList& sos) {
             plan.t[i][j] = step(sos, state, j == i ? 1.0 : 0.0);
         for (std::size_t r = 0; r < order; ++r) plan.q[i][r] = state[r];
     }
+    for (std::size_t j = 0; j < kBlock / 2; ++j) {
+        for (std::size_t k = 0; k < order; ++k) plan.od[k][j] = plan.o[k][2 * j + 1];
+        for (std::size_t i = 0; i < kBlock; ++i) plan.td[i][j] = plan.t[i][2 * j + 1];
+    }
+    auto single = [](const auto& from, auto& to) {
+        std::transform(&from[0][0], &from[0][0] + sizeof from / sizeof from[0][0], &to[0][0],
+                       [](double v) { return static_cast<float>(v); });
+    };
+    single(plan.p, plan.pf);
+    single(plan.q, plan.qf);
+    single(plan.od, plan.odf);
+    single(plan.td, plan.tdf);
     return plan;
 }
 
-SosCascade::SosCascade(const SosList& sos) : sections_(sos.size()) {
+SosCascade::SosCascade(const SosList& sos, Precision decimation)
+    : sections_(sos.size()), single_(decimation == Precision::Single) {
     if (sos.size() > 4) throw std::invalid_argument("a cascade has at most four sections");
     if (!sos.empty()) plan_ = std::make_shared<const IirBlockPlan>(makeIirBlockPlan(sos));
 }
 
 void SosCascade::reset() {
     state_.fill(0.0);
+    stateF_.fill(0.0F);
     pendingCount_ = 0;
     odd_ = false;
 }
 
-template <bool Decimate>
-std::size_t SosCascade::run(const float* in, std::size_t n, float* out) {
-    const KernelTable& k = kernels();
-    auto* const kernel = Decimate ? k.iirDecimate[sections_ - 1] : k.iir[sections_ - 1];
+template <bool Decimate, typename S>
+std::size_t SosCascade::run(Kernel<S> kernel, std::array<S, IirBlockPlan::kMaxOrder>& state,
+                            const float* in, std::size_t n, float* out) {
     constexpr std::size_t kStep = Decimate ? 2 : 1;  // inputs per output
     std::size_t written = 0;
     std::size_t pos = 0;
@@ -76,7 +89,7 @@ std::size_t SosCascade::run(const float* in, std::size_t n, float* out) {
         std::copy(in + pos, in + pos + take, pending_.begin() + static_cast<std::ptrdiff_t>(from));
         std::fill(pending_.begin() + static_cast<std::ptrdiff_t>(from + take), pending_.end(),
                   0.0F);
-        alignas(32) std::array<double, IirBlockPlan::kMaxOrder> s = state_;
+        alignas(32) std::array<S, IirBlockPlan::kMaxOrder> s = state;
         float y[kBlock];
         kernel(*plan_, s.data(), pending_.data(), 1, y);
         for (std::size_t j = from; j < from + take; ++j) {
@@ -89,14 +102,14 @@ std::size_t SosCascade::run(const float* in, std::size_t n, float* out) {
         pendingCount_ += take;
         pos += take;
         if (pendingCount_ == kBlock) {
-            state_ = s;
+            state = s;
             pendingCount_ = 0;
         }
     };
     if (pendingCount_ > 0) partial(std::min(n, kBlock - pendingCount_));
     const std::size_t blocks = (n - pos) / kBlock;
     if (blocks > 0) {
-        kernel(*plan_, state_.data(), in + pos, blocks, out + written);
+        kernel(*plan_, state.data(), in + pos, blocks, out + written);
         pos += blocks * kBlock;
         written += blocks * kBlock / kStep;
     }
@@ -109,7 +122,7 @@ void SosCascade::process(const float* in, float* out, std::size_t n) {
         if (out != in) std::copy(in, in + n, out);
         return;
     }
-    run<false>(in, n, out);
+    run<false>(kernels().iir[sections_ - 1], state_, in, n, out);
 }
 
 std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* out) {
@@ -121,7 +134,8 @@ std::size_t SosCascade::processDecimate(const float* in, std::size_t n, float* o
         }
         return written;
     }
-    return run<true>(in, n, out);
+    if (single_) return run<true>(kernels().iirDecimateF, stateF_, in, n, out);
+    return run<true>(kernels().iirDecimate[sections_ - 1], state_, in, n, out);
 }
 
 BandZeros::BandZeros(unsigned order) : order_(order) {
@@ -135,17 +149,27 @@ void BandZeros::process(const float* in, std::size_t n, T* out) {
         return;
     }
     const KernelTable& k = kernels();
-    for (std::size_t start = 0; start < n; start += kPiece) {
-        const std::size_t m = std::min(kPiece, n - start);
-        std::copy(in + start, in + start + m, padded_.begin() + 8);
+    auto* const kernel = [&] {
         if constexpr (std::is_same_v<T, float>) {
-            k.zerosF[order_ - 1](padded_.data() + 8, m, out + start);
+            return k.zerosF[order_ - 1];
         } else {
-            k.zerosD[order_ - 1](padded_.data() + 8, m, out + start);
+            return k.zerosD[order_ - 1];
         }
-        // The last eight samples lead the next piece.
-        std::copy(padded_.begin() + static_cast<std::ptrdiff_t>(m),
-                  padded_.begin() + static_cast<std::ptrdiff_t>(m + 8), padded_.begin());
+    }();
+    // The first eight outputs read the last samples of the previous call, the others only
+    // this call's.
+    const std::size_t head = std::min<std::size_t>(n, 8);
+    std::array<float, 16> start{};
+    std::copy(last_.begin(), last_.end(), start.begin());
+    std::copy(in, in + head, start.begin() + 8);
+    kernel(start.data() + 8, head, out);
+    if (n > 8) kernel(in + 8, n - 8, out + 8);
+    // Keep the last eight samples.
+    if (n >= 8) {
+        std::copy(in + n - 8, in + n, last_.begin());
+    } else {
+        std::copy(start.begin() + static_cast<std::ptrdiff_t>(n),
+                  start.begin() + static_cast<std::ptrdiff_t>(n + 8), last_.begin());
     }
 }
 
@@ -158,7 +182,7 @@ SosLanes<T>::SosLanes(const std::vector<SosList>& sos) {
     if (sections_ > kMaxSections) throw std::invalid_argument("too many sections for a lane");
     coef_.assign(sections_ * 2 * kLaneWidth, T{});
     gain_.assign(kLaneWidth, T{});
-    pick_.assign(kLaneWidth, T{});
+    zero_.assign(kLaneWidth, T{});
     state_.assign(sections_ * 2 * kLaneWidth, T{});
     std::vector<unsigned> orders;
     for (std::size_t l = 0; l < kLaneWidth && l < sos.size(); ++l) {
@@ -193,16 +217,17 @@ SosLanes<T>::SosLanes(const std::vector<SosList>& sos) {
         }
         gain_[l] = static_cast<T>(gain);
         orders.push_back(n);
-        pick_[l] = static_cast<T>(n);  // resolved below
+        zero_[l] = static_cast<T>(n);  // resolved below
     }
     if (orders.empty()) return;
-    low_ = *std::min_element(orders.begin(), orders.end());
-    high_ = *std::max_element(orders.begin(), orders.end());
-    for (const unsigned n : orders) {
-        if (n != low_ && n != high_) throw std::invalid_argument("lanes of three zero orders");
+    order_ = *std::min_element(orders.begin(), orders.end());
+    const unsigned most = *std::max_element(orders.begin(), orders.end());
+    if (most > order_ + 1) {
+        throw std::invalid_argument("lanes whose numbers of sections differ by more than one");
     }
+    extra_ = most != order_;
     for (std::size_t l = 0; l < kLaneWidth; ++l) {
-        pick_[l] = pick_[l] == static_cast<T>(high_) && high_ != low_ ? T{1} : T{0};
+        zero_[l] = extra_ && zero_[l] == static_cast<T>(most) ? T{1} : T{0};
     }
 }
 
@@ -212,18 +237,18 @@ void SosLanes<T>::reset() {
 }
 
 template <typename T>
-void SosLanes<T>::process(const T* uLow, const T* uHigh, std::size_t n, float* out) {
+void SosLanes<T>::process(const T* u, std::size_t n, float* out) {
     if (sections_ == 0) {
         std::fill(out, out + n * kLaneWidth, 0.0F);
         return;
     }
     const KernelTable& k = kernels();
     if constexpr (std::is_same_v<T, float>) {
-        k.lanesF[sections_ - 1](uLow, uHigh, n, out, coef_.data(), gain_.data(), pick_.data(),
-                                state_.data());
+        k.lanesF[sections_ - 1](u, n, out, coef_.data(), gain_.data(),
+                                extra_ ? zero_.data() : nullptr, state_.data());
     } else {
-        k.lanesD[sections_ - 1](uLow, uHigh, n, out, coef_.data(), gain_.data(), pick_.data(),
-                                state_.data());
+        k.lanesD[sections_ - 1](u, n, out, coef_.data(), gain_.data(),
+                                extra_ ? zero_.data() : nullptr, state_.data());
     }
 }
 

@@ -19,20 +19,25 @@ namespace SlmLibrary {
 IirBlockPlan makeIirBlockPlan(const SosList& sos);
 
 // One signal through a cascade of up to four sections, double precision (used where poles
-// sit close to z = 1 at the full rate: frequency weighting, filtered channel, anti-alias
-// filters). The cascade runs in blocks of eight samples counted from reset: each block is
-// one state-space step (the state of the sections' transposed direct form II at the block
-// start, times fixed matrices, plus the block's inputs times fixed matrices, computed once
-// from the sections), which turns a chain of dependent multiply-adds per sample into
-// independent vector operations. The outputs of a block that a call leaves unfinished come
-// from the same step with its missing inputs zero (they do not reach earlier outputs), and
-// the block is finished by the next call: results do not depend on how the signal is cut
-// into calls.
+// sit close to z = 1 at the full rate: frequency weighting, filtered channel), or for
+// decimation in single precision (anti-alias filters). The cascade runs in blocks of sixteen
+// samples counted from reset: each block is one state-space step (the state of the
+// sections' transposed direct form II at the block start, times fixed matrices, plus the
+// block's inputs times fixed matrices, computed once from the sections), which turns a chain
+// of dependent multiply-adds per sample into independent vector operations. The outputs of
+// a block that a call leaves unfinished come from the same step with its missing inputs
+// zero (they do not reach earlier outputs), and the block is finished by the next call:
+// results do not depend on how the signal is cut into calls.
 class SosCascade {
 public:
+    enum class Precision { Double, Single };
+
     SosCascade() = default;
-    // Throws std::invalid_argument for more than four sections.
-    explicit SosCascade(const SosList& sos);
+    // decimation: the precision of processDecimate. Single (state and block matrices in
+    // float) suits filters whose poles stay well inside the unit circle, such as the
+    // anti-alias filters of the octave bank: their rounding noise stays near that of the
+    // float samples themselves. Throws std::invalid_argument for more than four sections.
+    explicit SosCascade(const SosList& sos, Precision decimation = Precision::Double);
 
     void reset();
     // in and out may be the same array.
@@ -45,12 +50,18 @@ public:
     std::size_t sections() const { return sections_; }
 
 private:
-    template <bool Decimate>
-    std::size_t run(const float* in, std::size_t n, float* out);
+    template <typename S>
+    using Kernel = void (*)(const IirBlockPlan&, S*, const float*, std::size_t, float*);
+    template <bool Decimate, typename S>
+    std::size_t run(Kernel<S> kernel, std::array<S, IirBlockPlan::kMaxOrder>& state,
+                    const float* in, std::size_t n, float* out);
 
     std::size_t sections_ = 0;
+    bool single_ = false;
     std::shared_ptr<const IirBlockPlan> plan_;  // read-only, shared by copies
-    alignas(32) std::array<double, IirBlockPlan::kMaxOrder> state_{};  // at the block start
+    // At the block start, double or single precision.
+    alignas(32) std::array<double, IirBlockPlan::kMaxOrder> state_{};
+    alignas(32) std::array<float, IirBlockPlan::kMaxOrder> stateF_{};
     std::array<float, IirBlockPlan::kBlock> pending_{};  // inputs of the unfinished block
     std::size_t pendingCount_ = 0;
     bool odd_ = false;  // decimation phase (no sections)
@@ -64,23 +75,24 @@ public:
     // Throws std::invalid_argument for an order above 4.
     explicit BandZeros(unsigned order = 0);
     unsigned order() const { return order_; }
-    void reset() { padded_.fill(0.0F); }
+    void reset() { last_.fill(0.0F); }
     // out[i] for in[i], i < n; T is float or double.
     template <typename T>
     void process(const float* in, std::size_t n, T* out);
 
 private:
-    static constexpr std::size_t kPiece = 256;
     unsigned order_;
-    std::array<float, 8 + kPiece> padded_{};  // the last eight samples, then a piece
+    std::array<float, 8> last_{};  // the last eight input samples
 };
 
 // Up to kLaneWidth band-pass filters fed with the same signal, run side by side: each lane
 // is one band. A band-pass of n sections has the zeros (1 - z^-2)^n, which BandZeros applies
 // once for every lane: the lanes then run all-pole sections (two multiply-adds per section
 // and sample, one of them on the recursion) and their gain. Lanes with fewer sections than
-// others get pass-through sections; lanes may need two different zero orders (`low` and
-// `high`, each lane picks one).
+// others get pass-through sections. The input holds the zeros of the lanes with the fewest
+// sections; lanes with one section more apply their last (1 - z^-2) themselves, to the input
+// of their last section (the bands next to a stage's Nyquist frequency, where that pair
+// costs no precision).
 inline constexpr std::size_t kLaneWidth = 8;
 
 template <typename T>
@@ -91,25 +103,25 @@ public:
     SosLanes() = default;
     // sos[l] is the cascade of lane l (empty for an unused lane, which reads 0); at most
     // kMaxSections sections per lane, each lane's numerator a multiple of (1 - z^-2)^n with
-    // n its number of sections (throws std::invalid_argument otherwise).
+    // n its number of sections, and the numbers of sections of the lanes at most one apart
+    // (throws std::invalid_argument otherwise).
     explicit SosLanes(const std::vector<SosList>& sos);
 
     void reset();
-    // Zero orders the lanes read (equal when every lane reads the same).
-    unsigned lowOrder() const { return low_; }
-    unsigned highOrder() const { return high_; }
-    // uLow / uHigh: the band signal through BandZeros of lowOrder / highOrder; out receives
-    // n frames of kLaneWidth floats (lane-interleaved).
-    void process(const T* uLow, const T* uHigh, std::size_t n, float* out);
+    // The zero order of the input (the fewest sections of a lane).
+    unsigned order() const { return order_; }
+    // u: the band signal through BandZeros of order(); out receives n frames of kLaneWidth
+    // floats (lane-interleaved).
+    void process(const T* u, std::size_t n, float* out);
     std::size_t sections() const { return sections_; }
 
 private:
     std::size_t sections_ = 0;
-    unsigned low_ = 0;
-    unsigned high_ = 0;
+    unsigned order_ = 0;
     std::vector<T> coef_;   // [section][a1 a2][lane]
     std::vector<T> gain_;   // [lane]
-    std::vector<T> pick_;   // [lane]: 1 where the lane reads the high order
+    std::vector<T> zero_;   // [lane]: 1 where the last section adds a pair of zeros
+    bool extra_ = false;    // some lane does
     std::vector<T> state_;  // [section][w1 w2][lane]
 };
 
