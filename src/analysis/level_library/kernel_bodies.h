@@ -17,7 +17,7 @@
 
 // N: state size (2 per section); Decimate: keep the odd outputs only.
 template <std::size_t N, bool Decimate>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& pl, double* state,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void iirRun(const IirBlockPlan& pl, double* state,
                                                             const float* in, std::size_t blocks,
                                                             float* out) {
     constexpr std::size_t B = IirBlockPlan::kBlock;
@@ -110,7 +110,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirRun(const IirBlockPlan& 
 
 // The same cascade sample by sample (transposed direct form II, the state of iirRun).
 template <std::size_t N, bool Decimate>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void iirSerial(const IirBlockPlan& pl,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void iirSerial(const IirBlockPlan& pl,
                                                                double* state, const float* in,
                                                                std::size_t blocks, float* out) {
     constexpr std::size_t K = N / 2;
@@ -220,7 +220,7 @@ struct LaneVec<double> {
 // between (1 - a)^8 y and y + a sum_j p_j (p >= 0); only when that range reaches beyond the
 // extremes so far are the block's levels computed one by one to update them.
 // Squares of lanes 4h .. 4h + 3 of the frame at f.
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void squares(const float* f, std::size_t h,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void squares(const float* f, std::size_t h,
                                                              V4d& p) {
     V4f part;
     __builtin_memcpy(&part, f + 4 * h, sizeof part);
@@ -230,7 +230,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void squares(const float* f, std
 }
 
 // mag = max(mag, |frame at f|).
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void largest(const float* f, V8f& mag) {
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void largest(const float* f, V8f& mag) {
     V8i bits;
     __builtin_memcpy(&bits, f, sizeof bits);
     bits &= V8i{} + 0x7fffffff;
@@ -240,7 +240,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void largest(const float* f, V8f
 }
 
 // One frame's time weighting the direct way, and its extremes; p receives the squares.
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void weigh(const float* f, std::size_t h,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void weigh(const float* f, std::size_t h,
                                                            const V4d& a, const V4d& keep, V4d& y,
                                                            V4d& mx, V4d& mn, V4d& p) {
     squares(f, h, p);
@@ -250,7 +250,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void weigh(const float* f, std::
     ORV_MIN_D(mn, y);
 }
 
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline bool anyBit(const V8i& v) {
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline bool anyBit(const V8i& v) {
     V4l wide;
     __builtin_memcpy(&wide, &v, sizeof wide);
     return ((wide[0] | wide[1]) | (wide[2] | wide[3])) != 0;
@@ -258,7 +258,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline bool anyBit(const V8i& v) {
 
 // Records frames first .. first + count - 1 for the peak search when their largest
 // magnitudes bm reach a lane's threshold.
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void candidate(const LevelRun& r, const V8f& bm,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void candidate(const LevelRun& r, const V8f& bm,
                                                                const V8f& reach, std::size_t first,
                                                                std::size_t count) {
     const V8i hit = bm >= reach;
@@ -270,7 +270,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void candidate(const LevelRun& r
 }
 
 template <std::size_t H>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void levelsRun(const float* frames, std::size_t n,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void levelsRun(const float* frames, std::size_t n,
                                                                const LevelRun& r) {
     V4d e[H], y[H], mx[H], mn[H];
     V8f mag;
@@ -374,7 +374,7 @@ ORV_KERNEL_TARGET void levels(const float* frames, std::size_t n, const LevelRun
 // Extra: some lanes have one section more than the zeros of the input: their last section
 // first applies the remaining (1 - z^-2) to its input, the previous section's output.
 template <typename T, std::size_t K, bool Extra>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void lanesRun(const T* u, std::size_t n, float* out,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void lanesRun(const T* u, std::size_t n, float* out,
                                                               const T* coef, const T* gain,
                                                               const T* zero, T* state) {
     using V = typename LaneVec<T>::V;
@@ -454,7 +454,7 @@ ORV_LANES_ENTRY(lanesD4, double, 4)
 // (1 - z^-2)^Order of x (x[-8] .. x[-1] readable), in double, stored as T; eight outputs a
 // step.
 template <typename T, unsigned Order>
-ORV_KERNEL_TARGET [[gnu::always_inline]] inline void zerosRun(const float* x, std::size_t n,
+[[gnu::always_inline]] ORV_KERNEL_TARGET inline void zerosRun(const float* x, std::size_t n,
                                                               T* out) {
     constexpr double kCoef[5][5] = {
         {1, 0, 0, 0, 0}, {1, -1, 0, 0, 0}, {1, -2, 1, 0, 0}, {1, -3, 3, -1, 0}, {1, -4, 6, -4, 1}};
@@ -466,7 +466,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void zerosRun(const float* x, st
         ORV_WIDEN(acc, v);
 #pragma GCC unroll 4
         for (unsigned j = 1; j <= Order; ++j) {
-            __builtin_memcpy(&v, x + i - 2 * j, sizeof v);
+            __builtin_memcpy(&v, x - 2 * j + i, sizeof v);
             V4d w;
             ORV_WIDEN(w, v);
             acc += kCoef[Order][j] * w;
@@ -482,7 +482,7 @@ ORV_KERNEL_TARGET [[gnu::always_inline]] inline void zerosRun(const float* x, st
     for (; i < n; ++i) {
         double acc = x[i];
         for (unsigned j = 1; j <= Order; ++j)
-            acc += kCoef[Order][j] * static_cast<double>(x[i - 2 * j]);
+            acc += kCoef[Order][j] * static_cast<double>((x - 2 * j)[i]);
         out[i] = static_cast<T>(acc);
     }
 }

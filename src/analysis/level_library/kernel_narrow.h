@@ -127,8 +127,7 @@ ORV_NARROW_LANES(lanesNarrowD4, double, 4)
 
 // The two doubles of a float pair: lanes 2q, 2q + 1 of v.
 inline V2d widenPair(const V4f& v, std::size_t q) {
-    return q == 0 ? __builtin_ia32_cvtps2pd(v)
-                  : __builtin_ia32_cvtps2pd(__builtin_shuffle(v, V4i{2, 3, 2, 3}));
+    return q == 0 ? V2d{v[0], v[1]} : V2d{v[2], v[3]};
 }
 
 // Statistics (levelsRun) of H four-lane halves, each as two pairs of doubles; the largest

@@ -97,6 +97,16 @@ constexpr bool kIirBlocks = true;
 #define ORV_KERNEL_TARGET __attribute__((target("avx2,fma"), optimize("fp-contract=fast")))
 #endif
 #define ORV_SELECT ORV_SELECT_VECTOR
+#if defined(__clang__)
+// clang (the sanitizer and fuzz builds) has not gcc's shuffle and AVX builtins; the plain
+// vector forms give it the same instructions.
+#define ORV_BROADCAST(v, k) ((v)[k] - V4d{})
+#define ORV_BROADCAST_LOAD(out, p) ((out) = *(p)-V4d{})
+#define ORV_BROADCAST_F(out, v, k) ((out) = (v)[k] - V8f{})
+#define ORV_ALL_SET(v) (((v)[0] & (v)[1] & (v)[2] & (v)[3]) == -1)
+#define ORV_WIDEN(out, v) ((out) = __builtin_convertvector((v), V4d))
+#define ORV_NARROW(out, v) ((out) = __builtin_convertvector((v), V4f))
+#else
 #define ORV_BROADCAST(v, k)                                                        \
     __builtin_shuffle(v, V4l{static_cast<long long>(k), static_cast<long long>(k), \
                              static_cast<long long>(k), static_cast<long long>(k)})
@@ -105,6 +115,7 @@ constexpr bool kIirBlocks = true;
 #define ORV_ALL_SET(v) (__builtin_ia32_movmskpd256(reinterpret_cast<V4d>(v)) == 0xf)
 #define ORV_WIDEN(out, v) ((out) = __builtin_ia32_cvtps2pd256(v))
 #define ORV_NARROW(out, v) ((out) = __builtin_ia32_cvtpd2ps256(v))
+#endif
 #include "kernel_bodies.h"
 const KernelTable kTable = {
     kTableName,
