@@ -189,26 +189,14 @@ Image decodePng(const std::string& png) {
         for (std::size_t x = 0; x < stride; ++x) {
             const int a = x >= channels ? cur[x - channels] : 0, b = prev[x],
                       c = x >= channels ? prev[x - channels] : 0;
-            int p = 0;
-            switch (filter) {
-                case 1:
-                    p = a;
-                    break;
-                case 2:
-                    p = b;
-                    break;
-                case 3:
-                    p = (a + b) / 2;
-                    break;
-                case 4: {
-                    const int pa = std::abs(b - c), pb = std::abs(a - c),
-                              pc = std::abs(a + b - 2 * c);
-                    p = pa <= pb && pa <= pc ? a : pb <= pc ? b : c;
-                    break;
-                }
-                default:
-                    break;
-            }
+            // Filters 1-4: sub, up, average, Paeth.
+            const int pa = std::abs(b - c), pb = std::abs(a - c), pc = std::abs(a + b - 2 * c);
+            const int paeth = pa <= pb && pa <= pc ? a : pb <= pc ? b : c;
+            const int p = filter == 1   ? a
+                          : filter == 2 ? b
+                          : filter == 3 ? (a + b) / 2
+                          : filter == 4 ? paeth
+                                        : 0;
             cur[x] = static_cast<std::uint8_t>(line[x] + p);
         }
         for (std::size_t x = 0; x < stride; x += channels)
