@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "config/command_line.h"
 #include "support/test_support.h"
 
@@ -46,10 +48,23 @@ TEST(Usage, HasEightyStringsAndVersion) {
     }
 }
 
-TEST(Run, TooFewArgumentsPrintsStartupThenUsage) {
-    const auto r = runTool({"-s", "only"});
-    EXPECT_EQ(r.status, -1);
-    EXPECT_EQ(r.output, kStartup + usageText());
+// A refused line prints the start-up lines (after the processor message, when there is one),
+// the parser's messages and the usage text, and ends the run with -1.
+TEST(Run, RefusedLinesPrintStartupMessagesThenUsage) {
+    TempDir dir;
+    const std::string processor = "MSG: Non Intel Processor found. px version of code was set\r\n";
+    const std::tuple<std::vector<std::string>, int, std::string> cases[] = {
+        {{"-s", "only"}, 0, kStartup},  // too few arguments
+        {{"-s", dir.path(), "-i", "7", "-d", dir / "out", "-h"},
+         0,
+         kStartup + "ERROR - 7 is an invalid interval - Using default\r\n"},
+        {{"-s", "x"}, 20, processor + kStartup},
+    };
+    for (const auto& [args, vectorStatus, before] : cases) {
+        const auto r = runTool(args, vectorStatus);
+        EXPECT_EQ(r.status, -1) << args[1];
+        EXPECT_EQ(r.output, before + usageText()) << args[1];
+    }
 }
 
 TEST(Run, RealProcessExitsWith255OnRefusedLine) {
@@ -57,14 +72,6 @@ TEST(Run, RealProcessExitsWith255OnRefusedLine) {
     EXPECT_EQ(r.status, 255);
     EXPECT_EQ(r.output.rfind(kStartup, r.output.find("Using Fast")), r.output.find("Using Fast"));
     EXPECT_NE(r.output.find("Version :  V3.60"), std::string::npos);
-}
-
-TEST(Run, UnknownOptionAfterMessagesPrintsUsage) {
-    TempDir dir;
-    const auto r = runTool({"-s", dir.path(), "-i", "7", "-d", dir / "out", "-h"});
-    EXPECT_EQ(r.status, -1);
-    EXPECT_EQ(r.output,
-              kStartup + "ERROR - 7 is an invalid interval - Using default\r\n" + usageText());
 }
 
 TEST(Run, EmptySearchReportsNoSessions) {
@@ -78,13 +85,6 @@ TEST(Run, EmptySearchReportsNoSessions) {
     const auto real = runToolProcess({"-s", dir / "empty", "-d", dir / "out"});
     EXPECT_EQ(real.status, 0);
     EXPECT_EQ(real.output, r.output);
-}
-
-TEST(Run, ProcessorMessageComesFirst) {
-    const auto r = runTool({"-s", "x"}, 20);
-    EXPECT_EQ(r.output.rfind(
-                  "MSG: Non Intel Processor found. px version of code was set\r\n" + kStartup, 0),
-              0U);
 }
 
 TEST(Run, EachRunStartsFromFreshState) {

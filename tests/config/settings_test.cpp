@@ -11,32 +11,16 @@ namespace {
 
 using orv::ProcessingSettings;
 
-TEST(Percentiles, SortedAscendingWithEqualValuesKept) {
+// The order and the message of -p are the command line's tests; here the edges.
+TEST(Percentiles, EqualValuesKeptEmptyListRefusedNaNCannotHangTheSort) {
     ProcessingSettings s;
     std::string out;
     platform::Console console(&out);
-    const float values[] = {90, 10, 50};
-    EXPECT_EQ(orv::configurePercentiles(s, values, 3, console), 1);
-    EXPECT_EQ(s.percentiles, (std::vector<float>{10, 50, 90}));
-    EXPECT_EQ(out, "Configured 3 percentiles\r\n");
-
     const float equal[] = {50, 50, 10};
     EXPECT_EQ(orv::configurePercentiles(s, equal, 3, console), 1);
     EXPECT_EQ(s.percentiles, (std::vector<float>{10, 50, 50}));
-
-    const float one[] = {33.3F};
-    EXPECT_EQ(orv::configurePercentiles(s, one, 1, console), 1);
-    EXPECT_EQ(s.percentiles, (std::vector<float>{33.3F}));
-}
-
-TEST(Percentiles, EmptyListIsRefusedAndNaNCannotHangTheSort) {
-    ProcessingSettings s;
-    std::string out;
-    platform::Console console(&out);
-    const float one[] = {5};
-    ASSERT_EQ(orv::configurePercentiles(s, one, 1, console), 1);
     out.clear();
-    EXPECT_EQ(orv::configurePercentiles(s, one, 0, console), 0);
+    EXPECT_EQ(orv::configurePercentiles(s, equal, 0, console), 0);
     EXPECT_EQ(s.percentileCount(), 0U);
     EXPECT_EQ(out, "");
 
@@ -46,7 +30,7 @@ TEST(Percentiles, EmptyListIsRefusedAndNaNCannotHangTheSort) {
     EXPECT_EQ(s.percentiles[1], 50.0F);
     EXPECT_TRUE(std::isnan(s.percentiles[2]));
     EXPECT_FALSE(orv::isSortedAscending(withNan, 3));
-    EXPECT_TRUE(orv::isSortedAscending(one, 1));
+    EXPECT_TRUE(orv::isSortedAscending(equal + 2, 1));
 }
 
 TEST(Intervals, SettersStoreSixtyAsZeroAndRefuseOthersSilently) {
@@ -75,13 +59,19 @@ TEST(Intervals, SettersStoreSixtyAsZeroAndRefuseOthersSilently) {
 }
 
 TEST(Intervals, Boundaries) {
-    EXPECT_EQ(orv::isIntervalBoundary(45, 15), 1);
-    EXPECT_EQ(orv::isIntervalBoundary(50, 15), 0);
-    EXPECT_EQ(orv::isIntervalBoundary(0, 15), 1);
-    EXPECT_EQ(orv::isIntervalBoundary(0, 0), 1);
-    EXPECT_EQ(orv::isIntervalBoundary(30, 0), 0);
-    EXPECT_EQ(orv::isIntervalBoundary(56, 4), 1);
-    EXPECT_EQ(orv::isIntervalBoundary(58, 4), 0);
+    // {minute, interval, boundary}: interval 0 (60 minutes) has its boundary at 0 only.
+    for (const auto& [value, interval, boundary] : {std::tuple{45, 15, 1},
+                                                    {50, 15, 0},
+                                                    {0, 15, 1},
+                                                    {0, 0, 1},
+                                                    {30, 0, 0},
+                                                    {56, 4, 1},
+                                                    {58, 4, 0}}) {
+        EXPECT_EQ(orv::isIntervalBoundary(static_cast<std::uint16_t>(value),
+                                          static_cast<std::uint16_t>(interval)),
+                  boundary)
+            << value << " " << interval;
+    }
 }
 
 TEST(StartUp, DefaultsAndTheirMessages) {
@@ -117,14 +107,6 @@ TEST(StartUp, DefaultsAndTheirMessages) {
 
     orv::releaseLists(s, paths, table);
     EXPECT_EQ(s.percentileCount(), 0U);
-}
-
-TEST(FilterTables, BandEdgesAndAcceptedFrequencies) {
-    EXPECT_NEAR(orv::bandEdge(0), 22.387F, 0.001F);
-    EXPECT_NEAR(orv::bandEdge(30), 22387.2F, 0.1F);
-    EXPECT_EQ(orv::kAcceptedFilterFrequencies[11], 316);
-    EXPECT_EQ(orv::kAcceptedFilterFrequencies[16], 1000);
-    EXPECT_EQ(orv::kAcceptedFilterFrequencies[21], 3160);
 }
 
 }  // namespace

@@ -35,10 +35,12 @@ bool parseHeader(const std::string& text, DataFileHeader& h, std::size_t& first)
     return orv::parseDataFileHeader(data.get(), text.size(), h, first);
 }
 
-LevelRecordQueue decode(const std::string& records, LevelRecordQueue q = {}) {
+LevelRecordQueue decode(const std::string& records, LevelRecordQueue q = {},
+                        orv::DecodeReport* report = nullptr) {
     const auto data = std::make_unique<char[]>(records.size());
     std::copy(records.begin(), records.end(), data.get());
-    orv::decodeLevelRecords(data.get(), records.size(), q);
+    const orv::DecodeReport r = orv::decodeLevelRecords(data.get(), records.size(), q);
+    if (report != nullptr) *report = r;
     return q;
 }
 
@@ -129,18 +131,17 @@ TEST(LevelRecords, MalformedLinesAreLeftOutOneByOne) {
     };
     for (const std::string& bad : cases) {
         for (const char* end : {"\r\n", "\n", "\r"}) {
-            LevelRecordQueue q;
-            const std::string text = kRecord + bad + end + "\r\n" + bad + end + kRecord;
-            const auto data = std::make_unique<char[]>(text.size());
-            std::copy(text.begin(), text.end(), data.get());
-            const orv::DecodeReport report = orv::decodeLevelRecords(data.get(), text.size(), q);
-            EXPECT_EQ(q.size(), 2U) << bad;
+            orv::DecodeReport report;
+            EXPECT_EQ(
+                decode(kRecord + bad + end + "\r\n" + bad + end + kRecord, {}, &report).size(), 2U)
+                << bad;
             EXPECT_EQ(report.firstBadLine * 10 + report.badLines, 22U) << bad;  // lines 2 and 4
         }
     }
     // A last line without its line end is cut short; a lone line end is an empty line.
-    LevelRecordQueue q;
-    EXPECT_EQ(orv::decodeLevelRecords(kRecord.data(), kRecord.size() - 2, q).badLines, 1U);
+    orv::DecodeReport cut;
+    decode(kRecord.substr(0, kRecord.size() - 2), {}, &cut);
+    EXPECT_EQ(cut.badLines, 1U);
     EXPECT_EQ(decode(kRecord + "\r").size(), 1U);
     EXPECT_EQ(decode("\n").size(), 0U);
 }

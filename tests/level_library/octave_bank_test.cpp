@@ -79,7 +79,6 @@ void checkBankMask(OctaveFilter::Bank kind) {
 TEST(OctaveBank, EveryThirdOctaveBandIsInsideTheClass1MaskWithDecimation) {
     checkBankMask(OctaveFilter::Bank::Third);
 }
-
 TEST(OctaveBank, EveryOctaveBandIsInsideTheClass1MaskWithDecimation) {
     checkBankMask(OctaveFilter::Bank::Full);
 }
@@ -100,13 +99,7 @@ void checkMidBandLevels(bool third) {
     const OctaveFilter::Bank kind = third ? OctaveFilter::Bank::Third : OctaveFilter::Bank::Full;
     for (unsigned b = 0; b < OctaveFilter::bandCount(kind); ++b) {
         const double fm = OctaveFilter::midBandFrequency(kind, b);
-        Slm slm(kFs, 1, 48000);
-        if (third) {
-            slm.initThirdOct(TWeight::F, FWeight::Z, b, b, kFs, 0);
-        } else {
-            slm.initFullOct(TWeight::F, FWeight::Z, b, b, kFs, 0);
-        }
-        slm.resetAll();
+        Slm slm = level_library_test::bandMeter(third, TWeight::F, b, b);
         const auto preRoll =
             static_cast<std::size_t>(std::ceil(slm.settlingSeconds(b) * kFs / 32.0)) * 32;
         const auto measure =
@@ -131,14 +124,8 @@ TEST(BandLevels, BandPowersOfWhiteAndPinkNoiseSumToTheBroadbandPower) {
         level_library_test::bandLimit(x, 12.0, 18000.0);
         const double broadband = level_library_test::meanSquareDb(x, 4 * 48000);
         for (const bool third : {false, true}) {
-            Slm slm(kFs, 1, 48000);
             const unsigned last = third ? 35 : 11;
-            if (third) {
-                slm.initThirdOct(TWeight::F, FWeight::Z, 0, last, kFs, 0);
-            } else {
-                slm.initFullOct(TWeight::F, FWeight::Z, 0, last, kFs, 0);
-            }
-            slm.resetAll();
+            Slm slm = level_library_test::bandMeter(third, TWeight::F, 0, last);
             slm.preRoll(x.data(), 4 * 48000);
             feed(slm, x.data() + 4 * 48000, n - 4 * 48000);
             double sum = 0.0;

@@ -95,6 +95,18 @@ inline Reading readAux(const SlmLibrary::Slm& slm) {
     return r;
 }
 
+// A meter of the Z-weighted bands first..last of the third-octave or the octave bank.
+inline SlmLibrary::Slm bandMeter(bool third, unsigned tw, unsigned first, unsigned last) {
+    SlmLibrary::Slm slm(kFs, 1, 48000);
+    if (third) {
+        slm.initThirdOct(tw, SlmLibrary::FWeight::Z, first, last, kFs, 0);
+    } else {
+        slm.initFullOct(tw, SlmLibrary::FWeight::Z, first, last, kFs, 0);
+    }
+    slm.resetAll();
+    return slm;
+}
+
 // Feeds x in steps of at most one second, as the analysis work item does.
 inline void feed(SlmLibrary::Slm& slm, const float* x, std::size_t n, bool shortLeq = false) {
     for (std::size_t pos = 0; pos < n; pos += 48000) {

@@ -7,12 +7,13 @@
 
 #include "fweight.h"
 #include "reference_csv.h"
+#include "signals.h"
 
 namespace SlmLibrary {
 namespace {
 
+using level_library_test::kFs;
 using level_library_test::readReference;
-constexpr double kFs = 48000.0;
 
 // Level (dB re the input tone) of a steady sine after weighting, measured over whole
 // periods after the filter has settled.
@@ -24,11 +25,7 @@ ToneResponse measureTone(double f) {
     const std::size_t settle = 12000;
     const double periods = std::max(1.0, std::floor(0.25 * f));
     const auto measure = static_cast<std::size_t>(std::lround(periods * kFs / f));
-    std::vector<float> in(settle + measure);
-    for (std::size_t i = 0; i < in.size(); ++i) {
-        in[i] =
-            static_cast<float>(std::sin(2.0 * std::numbers::pi * f * static_cast<double>(i) / kFs));
-    }
+    const std::vector<float> in = level_library_test::sine(f, 1.0, settle + measure);
     std::vector<float> z(in.size()), c(in.size()), a(in.size());
     FWeight w(kFs);
     w.init(FWeight::All, kFs);
@@ -76,12 +73,7 @@ TEST(FrequencyWeighting, FollowsAnalogDefinitionAndClass1LimitsAtEveryThirdOctav
 }
 
 TEST(FrequencyWeighting, SingleOutputsMatchProcessAllAndKeepStateBetweenCalls) {
-    std::vector<float> in(9000);
-    std::uint32_t seed = 12345;
-    for (float& x : in) {
-        seed = seed * 1664525U + 1013904223U;
-        x = static_cast<float>(static_cast<double>(seed) / 4294967296.0 - 0.5);
-    }
+    const std::vector<float> in = level_library_test::whiteNoise(9000, 12345, 0.5);
     FWeight all(kFs);
     all.init(FWeight::All, kFs);
     std::vector<float> c(in.size()), a(in.size());

@@ -4,9 +4,9 @@
 #include <gtest/gtest.h>
 #include <zlib.h>
 
-#include <cctype>
 #include <cstdint>
 #include <cstdlib>
+#include <regex>
 #include <set>
 #include <string>
 #include <vector>
@@ -38,33 +38,14 @@ std::string visibleText(const std::string& html) {
     return text;
 }
 
-// Figures (numbers with a decimal), dates dd/mm/yyyy and clock times hh:mm in a text.
+// Figures (numbers with a decimal), dates dd/mm/yyyy and clock times hh:mm in a text, each
+// with the minus sign before it.
 std::vector<std::string> tokens(const std::string& t) {
-    const auto digits = [&](std::size_t at) {
-        std::size_t n = 0;
-        while (at + n < t.size() && std::isdigit(static_cast<unsigned char>(t[at + n]))) ++n;
-        return n;
-    };
+    static const std::regex token(R"(-?(\d\d/\d\d/\d{4}|\d\d:\d\d|\d+\.\d+))");
     std::vector<std::string> out;
-    for (std::size_t i = 0; i < t.size();) {
-        const std::size_t n = digits(i);
-        if (n == 0) {
-            ++i;
-            continue;
-        }
-        std::size_t len = n;
-        if (n == 2 && t.compare(i + 2, 1, "/") == 0 && digits(i + 3) == 2 && digits(i + 6) == 4)
-            len = 10;
-        else if (n == 2 && t.compare(i + 2, 1, ":") == 0 && digits(i + 3) == 2)
-            len = 5;
-        else if (t.compare(i + n, 1, ".") == 0 && digits(i + n + 1) > 0)
-            len = n + 1 + digits(i + n + 1);
-        if (len > n) {
-            std::string token(i > 0 && t[i - 1] == '-' ? 1 : 0, '-');
-            out.push_back(token.append(t, i, len));
-        }
-        i += len;
-    }
+    for (auto it = std::sregex_iterator(t.begin(), t.end(), token); it != std::sregex_iterator();
+         ++it)
+        out.push_back(it->str());
     return out;
 }
 
@@ -189,26 +170,14 @@ Image decodePng(const std::string& png) {
         for (std::size_t x = 0; x < stride; ++x) {
             const int a = x >= channels ? cur[x - channels] : 0, b = prev[x],
                       c = x >= channels ? prev[x - channels] : 0;
-            int p = 0;
-            switch (filter) {
-                case 1:
-                    p = a;
-                    break;
-                case 2:
-                    p = b;
-                    break;
-                case 3:
-                    p = (a + b) / 2;
-                    break;
-                case 4: {
-                    const int pa = std::abs(b - c), pb = std::abs(a - c),
-                              pc = std::abs(a + b - 2 * c);
-                    p = pa <= pb && pa <= pc ? a : pb <= pc ? b : c;
-                    break;
-                }
-                default:
-                    break;
-            }
+            // Filters 1-4: sub, up, average, Paeth.
+            const int pa = std::abs(b - c), pb = std::abs(a - c), pc = std::abs(a + b - 2 * c);
+            const int paeth = pa <= pb && pa <= pc ? a : pb <= pc ? b : c;
+            const int p = filter == 1   ? a
+                          : filter == 2 ? b
+                          : filter == 3 ? (a + b) / 2
+                          : filter == 4 ? paeth
+                                        : 0;
             cur[x] = static_cast<std::uint8_t>(line[x] + p);
         }
         for (std::size_t x = 0; x < stride; x += channels)

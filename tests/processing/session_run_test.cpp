@@ -43,9 +43,19 @@ protected:
     TempDir dir_;
 };
 
-TEST_F(SessionRun, ConstantLevelsComeBackAsEveryStatistic) {
+// Three minutes at a constant level: every statistic is that level. The first minute holds an
+// overload and the interval's lowest battery reading (a reading of 0.0 is no reading); the
+// second misses two records; the third is clean again.
+TEST_F(SessionRun, ConstantLevelsGapsBatteryAndOverloadPerInterval) {
     SessionLayout layout = namedSession("Quiet");
-    layout.levelFiles[0].rows = levelRows(1, 1800, [](std::size_t) { return 55.3F; });
+    auto all = makeRows(1800, 1, [](std::size_t slot, LevelRow& r) {
+        r.splA = r.splC = r.leqA = r.leqC = 55.3F;
+        r.battery = slot == 300 ? 11.9F : (slot == 400 ? 0.0F : 12.4F);
+        if (slot == 350) r.condition = 3;
+    });
+    all.erase(all.begin() + 700);
+    all.erase(all.begin() + 800);
+    layout.levelFiles[0].rows = all;
     addSession(layout, "Quiet");
     const RunResult r = run({"-i", "1"});
     ASSERT_EQ(r.status, 0) << r.output;
@@ -56,15 +66,17 @@ TEST_F(SessionRun, ConstantLevelsComeBackAsEveryStatistic) {
 
     const auto data = rows(result("Quiet.csv"));
     ASSERT_EQ(data.size(), 3U);  // 08:01, 08:02, 08:03; nothing for the partial last interval
+    const std::vector<std::vector<std::string>> ends = {
+        {"11.9", "1"}, {"12.4", "1", "Errors Found in Interval"}, {"12.4", "0"}};
     for (std::size_t i = 0; i < data.size(); ++i) {
         const auto& f = data[i];
-        ASSERT_EQ(f.size(), 16U);
+        SCOPED_TRACE(i);
+        ASSERT_EQ(f.size(), 14U + ends[i].size());
         EXPECT_EQ(f[0], "17/09/2020");
         EXPECT_EQ(f[1], "08:0" + std::to_string(i + 1));
         for (std::size_t k = 2; k <= 12; ++k) EXPECT_EQ(f[k], "55.3") << "column " << k;
         EXPECT_EQ(f[13], "21.5");  // temperature of the file header
-        EXPECT_EQ(f[14], "12.6");
-        EXPECT_EQ(f[15], "0");
+        EXPECT_EQ(std::vector<std::string>(f.begin() + 14, f.end()), ends[i]);
     }
 }
 
@@ -91,25 +103,6 @@ TEST_F(SessionRun, MixOfTwoLevelsGivesEnergyMeanAndPercentiles) {
     EXPECT_EQ(headerLines(result("Mix.csv"))[20],
               "\"Date\",\"Time\",\"Leq\",\"Lmax\",\"L1\",\"L10\",\"L25\",\"L26\",\"L50\",\"L90\","
               "\"Lmin\",\"Temp\",\"Battery\",\"Overload\"\r");
-}
-
-TEST_F(SessionRun, AGapMarksOnlyItsOwnInterval) {
-    SessionLayout layout = namedSession("Gappy");
-    auto all = levelRows(1, 1800, [](std::size_t) { return 60.0F; });
-    all.erase(all.begin() + 700);  // a record missing in the second minute
-    all.erase(all.begin() + 800);  // and a second gap in the same minute
-    layout.levelFiles[0].rows = all;
-    addSession(layout, "Gappy");
-    ASSERT_EQ(run({"-i", "1"}).status, 0);
-    const auto data = rows(result("Gappy.csv"));
-    ASSERT_EQ(data.size(), 3U);
-    EXPECT_EQ(data[0].size(), 16U);
-    EXPECT_EQ(data[0][15], "0");
-    ASSERT_EQ(data[1].size(), 17U);
-    EXPECT_EQ(data[1][15], "1");
-    EXPECT_EQ(data[1][16], "Errors Found in Interval");
-    EXPECT_EQ(data[2].size(), 16U);  // the next interval is clean again
-    EXPECT_EQ(data[2][15], "0");
 }
 
 TEST_F(SessionRun, MissingHourFileIsABreakInTheSequence) {
@@ -149,22 +142,6 @@ TEST_F(SessionRun, CWeightingUsesTheCColumns) {
     const auto leq = rows(result("Cw_LEQ.csv"));
     ASSERT_EQ(leq.size(), 2U);
     EXPECT_EQ(leq[0][2], "61.0");
-}
-
-TEST_F(SessionRun, BatteryIsTheIntervalsLowestReadingAndOverloadCoversTheInterval) {
-    SessionLayout layout = namedSession("Batt");
-    layout.levelFiles[0].rows = makeRows(1200, 1, [](std::size_t slot, LevelRow& r) {
-        r.battery = slot == 300 ? 11.9F : (slot == 400 ? 0.0F : 12.4F);
-        if (slot == 350) r.condition = 3;
-    });
-    addSession(layout, "Batt");
-    ASSERT_EQ(run({"-i", "1"}).status, 0);
-    const auto data = rows(result("Batt.csv"));
-    ASSERT_EQ(data.size(), 2U);
-    EXPECT_EQ(data[0][14], "11.9");
-    EXPECT_EQ(data[0][15], "1");
-    EXPECT_EQ(data[1][14], "12.4");
-    EXPECT_EQ(data[1][15], "0");
 }
 
 TEST_F(SessionRun, ShortLeqRowsReachTheirSessionsFile) {
@@ -216,35 +193,19 @@ TEST_F(SessionRun, TwoSessionsInOneRunGiveTheFilesOfTwoSeparateRuns) {
     EXPECT_EQ(rows(result("Beta.csv"))[0].size(), 16U);  // no gap mark carried over
 }
 
-TEST_F(SessionRun, HeaderBlockCarriesSessionAndFileValues) {
-    SessionLayout layout = namedSession("Hdr");
+// Three hourly files: progress by share of the files, or (-bin) by file name; the header
+// block carries the values of the information file and of the level files' header.
+TEST_F(SessionRun, ProgressLinesInBothLayoutsAndTheHeaderBlock) {
+    SessionLayout layout = namedSession("Prog");
     layout.info.sessionStart = "01/03/2020 09:05:07";
     layout.info.sessionEnd = "01/03/2020 11:00:00";
     layout.info.timeWeighting = "1";  // Slow
-    layout.levelFiles[0].header.serialNumber = "SN123456789";
-    layout.levelFiles[0].header.sessionTitle = std::string(90, 'T');
-    addSession(layout, "Hdr");
-    ASSERT_EQ(run({"-i", "60", "-bin"}).status, 0);
-    // Sub-directory layout: the time weighting and the 60-minute interval spell the name.
-    const std::string general = result("Hdr/GEN_A_60_S.csv");
-    const auto lines = headerLines(general);
-    ASSERT_EQ(lines.size(), 21U);
-    EXPECT_EQ(lines[0], "\"Quellmark -  Type 1 Environmental Noise Logger\"\r");
-    EXPECT_EQ(lines[1], "\"Logger Serial Number\",\"\",\"\",\"\",\"SN12345\"\r");
-    EXPECT_EQ(lines[2], "\"Measurement Title\",\"\",\"\",\"\",\"" + std::string(81, 'T') + "\"\r");
-    EXPECT_EQ(lines[3], "\"Measurement started at\",\"\",\"\",\"\",\"01/03/2020 - 09:05:07\"\r");
-    EXPECT_EQ(lines[4], "\"Measurement stopped at\",\"\",\"\",\"\",\"01/03/2020 - 11:00:00\"\r");
-    EXPECT_EQ(lines[6], "\"Time Averaging\",\"\",\"\",\"\",\"Slow\"\r");
-    EXPECT_EQ(lines[7], "\"Statistical Interval\",\"\",\"\",\"\",\"60 min\"\r");
-    EXPECT_EQ(lines[19], "\r");
-}
-
-TEST_F(SessionRun, ProgressLinesInBothLayouts) {
-    SessionLayout layout = namedSession("Prog");
     layout.levelFiles.clear();
     for (unsigned h = 8; h <= 10; ++h) {
         LevelFileLayout f;
         f.header.hour = h;
+        f.header.serialNumber = "SN123456789";
+        f.header.sessionTitle = std::string(90, 'T');
         f.rows = makeRows(5);
         layout.levelFiles.push_back(f);
     }
@@ -253,31 +214,38 @@ TEST_F(SessionRun, ProgressLinesInBothLayouts) {
     EXPECT_NE(r.output.find("33.3 % Complete\r\n66.7 % Complete\r\n100.0 % Complete\r\n\r\n"),
               std::string::npos)
         << r.output;
-    r = run({"-bin"});
+    r = run({"-i", "60", "-bin"});
     EXPECT_NE(
         r.output.find("data.000/20200917_08.csv Complete\r\ndata.000/20200917_09.csv Complete\r\n"
                       "data.000/20200917_10.csv Complete\r\n\r\n"),
         std::string::npos)
         << r.output;
+    // Sub-directory layout: the time weighting and the 60-minute interval spell the name.
+    const auto lines = headerLines(result("Prog/GEN_A_60_S.csv"));
+    ASSERT_EQ(lines.size(), 21U);
+    EXPECT_EQ(lines[1], "\"Logger Serial Number\",\"\",\"\",\"\",\"SN12345\"\r");
+    EXPECT_EQ(lines[2], "\"Measurement Title\",\"\",\"\",\"\",\"" + std::string(81, 'T') + "\"\r");
+    EXPECT_EQ(lines[3], "\"Measurement started at\",\"\",\"\",\"\",\"01/03/2020 - 09:05:07\"\r");
+    EXPECT_EQ(lines[4], "\"Measurement stopped at\",\"\",\"\",\"\",\"01/03/2020 - 11:00:00\"\r");
+    EXPECT_EQ(lines[6], "\"Time Averaging\",\"\",\"\",\"\",\"Slow\"\r");
+    EXPECT_EQ(lines[7], "\"Statistical Interval\",\"\",\"\",\"\",\"60 min\"\r");
 }
 
-TEST_F(SessionRun, SessionWhoseGeneralFileCannotBeCreatedIsSkipped) {
+// A session whose general file cannot be created is skipped and its results count as lost; a
+// session without readable records leaves a general file of the header only.
+TEST_F(SessionRun, SessionsWithoutResultsCostOnlyThemselves) {
     addSession(namedSession("First"), "First");
     addSession(namedSession("Second"), "Second");
+    SessionLayout empty = namedSession("Empty");
+    empty.levelFiles[0].rows.clear();
+    addSession(empty, "Empty");
     makeDirs(out() + "/First.csv");  // a directory where the file should go
     const RunResult r = run({});
-    EXPECT_EQ(r.status, 2);  // its results are lost
+    EXPECT_EQ(r.status, 2);
     EXPECT_NE(r.output.find("Unable to open " + out() + "/First.csv : 21\r\n"), std::string::npos)
         << r.output;
-    EXPECT_NE(r.output.find("Processed 2 out of 2 sessions"), std::string::npos);
+    EXPECT_NE(r.output.find("Processed 3 out of 3 sessions"), std::string::npos);
     EXPECT_TRUE(exists(result("Second.csv")));
-}
-
-TEST_F(SessionRun, SessionWithoutReadableRecordsLeavesAnEmptyGeneralFile) {
-    SessionLayout layout = namedSession("Empty");
-    layout.levelFiles[0].rows.clear();
-    addSession(layout, "Empty");
-    ASSERT_EQ(run({}).status, 0);
     EXPECT_EQ(rows(result("Empty.csv")).size(), 0U);
     EXPECT_EQ(headerLines(result("Empty.csv")).size(), 21U);
 }
@@ -289,6 +257,10 @@ TEST_F(SessionRun, RelativePathsKeepWorkingForEverySession) {
     ASSERT_EQ(::chdir(dir_.path().c_str()), 0);
     const RunResult r = runTool({"-s", "sessions", "other/Two", "-d", "out"});
     EXPECT_EQ(r.status, 0);
+    EXPECT_NE(r.output.find("Finding Sessions...\r\nMSG: Added - \"One\".\r\nMSG: Added - "
+                            "\"other/Two\".\r\nFound 2 Session(s)\r\n"),
+              std::string::npos)
+        << r.output;
     EXPECT_NE(r.output.find("Processed 2 out of 2 sessions"), std::string::npos);
     EXPECT_TRUE(exists(result("One.csv")));
     EXPECT_TRUE(exists(result("Two.csv")));

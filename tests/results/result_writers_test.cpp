@@ -52,11 +52,16 @@ const char* const kGeneralHeader =
     "\"Engineering Units\",\"\",\"\",\"\",\"dB SPL\"\r\n"
     "\r\n";
 
-TEST(GeneralResults, HeaderBlockAndColumnLine) {
+// A temporary output directory and the run's record of lost results, with its console.
+class Writers : public ::testing::Test {
+protected:
     TempDir dir;
     std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
+    platform::Console out{&console};
+    orv::RunResults run{out};
+};
+
+TEST_F(Writers, GeneralHeaderBlockAndColumnLine) {
     orv::GeneralResultsWriter writer(run);
     ASSERT_TRUE(writer.open(dir / "S1.csv"));
     ASSERT_TRUE(writer.writeHeader(sampleInfo(), 2));
@@ -71,7 +76,7 @@ TEST(GeneralResults, HeaderBlockAndColumnLine) {
     EXPECT_FALSE(orv::GeneralResultsWriter(run).writeHeader(sampleInfo(), 2));  // not open
 }
 
-TEST(GeneralResults, Rows) {
+TEST_F(Writers, GeneralRows) {
     orv::GeneralIntervalRecord r;
     r.day = 5;
     r.month = 5;
@@ -99,9 +104,6 @@ TEST(GeneralResults, Rows) {
     EXPECT_EQ(std::count(row.begin(), row.end(), ','), 4 + 100 + 4);
     EXPECT_NE(row.find("\"Errors Found in Interval\"\r\n"), std::string::npos);
 
-    std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
     EXPECT_TRUE(orv::GeneralResultsWriter(run).writeRow(r));  // closed: nothing, but no failure
 }
 
@@ -115,11 +117,18 @@ void replaceLine(std::string& text, const std::string& key, const std::string& l
     text.replace(at, text.find("\r\n", at) + 2 - at, line);
 }
 
-TEST(LeqResults, HeadersOfBothFiles) {
-    TempDir dir;
-    std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
+// Both Leq files: their header blocks and column lines, and rows sent to the file their level
+// count selects.
+TEST_F(Writers, LeqHeadersAndRows) {
+    orv::LeqRow row;
+    row.time = {2021, 1, 0, 2, 12, 0, 5, 0};
+    row.levels = {54.26F};
+    row.errorsInInterval = 1;
+    row.overload = 3;
+    EXPECT_EQ(orv::LeqResultsWriter::formatRow(row),
+              "\"02/01/2021\",\"'12:00:05.0\",\"54.3\",\"3\",\"Errors Found in Interval\"\r\n");
+    row.errorsInInterval = 0;
+
     orv::LeqResultsWriter writer(run);
     ASSERT_TRUE(writer.open(orv::LeqFileKind::AllPass, dir / "S1_LEQ.csv"));
     ASSERT_TRUE(writer.open(orv::LeqFileKind::Octave, dir / "S1_LEQ1OCT.csv"));
@@ -128,6 +137,11 @@ TEST(LeqResults, HeadersOfBothFiles) {
     ASSERT_TRUE(writer.formatHeader(orv::LeqFileKind::Octave, sampleInfo(), 12));
     ASSERT_TRUE(writer.writeColumnHeader(orv::LeqFileKind::Octave));
     EXPECT_EQ(writer.lineCount(orv::LeqFileKind::AllPass), 21U);
+    EXPECT_TRUE(writer.writeRow(row));
+    row.levels.assign(12, 40.0F);
+    EXPECT_TRUE(writer.writeRow(row));
+    row.levels.clear();
+    EXPECT_FALSE(writer.writeRow(row));  // no levels: written nowhere
     writer.close(orv::LeqFileKind::AllPass);
     writer.close(orv::LeqFileKind::Octave);
 
@@ -135,7 +149,8 @@ TEST(LeqResults, HeadersOfBothFiles) {
     replaceLine(expected, "\"Time Averaging", kLeqAllPassLine7);
     replaceLine(expected, "\"Short Term Leq Length", kLeqLine12);
     EXPECT_EQ(readFile(dir / "S1_LEQ.csv"),
-              expected + "\"Date\",\"Time\",\"AP Leq\",\"Overload\"\r\n");
+              expected + "\"Date\",\"Time\",\"AP Leq\",\"Overload\"\r\n" +
+                  "\"02/01/2021\",\"'12:00:05.0\",\"54.3\",\"3\",\r\n");
 
     const std::string octave = readFile(dir / "S1_LEQ1OCT.csv");
     EXPECT_NE(octave.find("\"Frequency Weighting\",\"\",\"\",\"\",\"C\"\r\n"), std::string::npos);
@@ -143,46 +158,12 @@ TEST(LeqResults, HeadersOfBothFiles) {
     EXPECT_NE(
         octave.find("\r\n\r\n\"Date\",\"Time\",\"8Hz\",\"16Hz\",\"31.5Hz\",\"63Hz\",\"125Hz\","
                     "\"250Hz\",\"500Hz\",\"1kHz\",\"2kHz\",\"4kHz\",\"8kHz\",\"16kHz\","
-                    "\"Overload\"\r\n"),
+                    "\"Overload\"\r\n\"02/01/2021\",\"'12:00:05.0\",\"40.0\","),
         std::string::npos);
+    EXPECT_EQ(std::count(octave.begin(), octave.end(), '\n'), 22);
 }
 
-TEST(LeqResults, RowsGoToTheFileTheirLevelCountSelects) {
-    orv::LeqRow row;
-    row.time = {2021, 1, 0, 2, 12, 0, 5, 0};
-    row.levels = {54.26F};
-    EXPECT_EQ(orv::LeqResultsWriter::formatRow(row),
-              "\"02/01/2021\",\"'12:00:05.0\",\"54.3\",\"0\",\r\n");
-    row.errorsInInterval = 1;
-    row.overload = 3;
-    EXPECT_EQ(orv::LeqResultsWriter::formatRow(row),
-              "\"02/01/2021\",\"'12:00:05.0\",\"54.3\",\"3\",\"Errors Found in Interval\"\r\n");
-
-    TempDir dir;
-    std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
-    orv::LeqResultsWriter writer(run);
-    ASSERT_TRUE(writer.open(orv::LeqFileKind::AllPass, dir / "a.csv"));
-    ASSERT_TRUE(writer.open(orv::LeqFileKind::Octave, dir / "o.csv"));
-    row.errorsInInterval = 0;
-    EXPECT_TRUE(writer.writeRow(row));
-    row.levels.assign(36, 40.0F);
-    EXPECT_TRUE(writer.writeRow(row));
-    row.levels.clear();
-    EXPECT_FALSE(writer.writeRow(row));  // no levels: written nowhere
-    writer.close(orv::LeqFileKind::AllPass);
-    writer.close(orv::LeqFileKind::Octave);
-    EXPECT_EQ(readFile(dir / "a.csv"), "\"02/01/2021\",\"'12:00:05.0\",\"54.3\",\"3\",\r\n");
-    const std::string octave = readFile(dir / "o.csv");
-    EXPECT_EQ(std::count(octave.begin(), octave.end(), ','), 2 + 36 + 1);
-}
-
-TEST(LeqResults, RollsOverIntoNumberedPartsWithTheSameHeader) {
-    TempDir dir;
-    std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
+TEST_F(Writers, LeqRollsOverIntoNumberedPartsWithTheSameHeader) {
     orv::LeqResultsWriter writer(run, 25);  // parts of 25 lines: 21 header lines + 4 rows
     ASSERT_TRUE(writer.open(orv::LeqFileKind::AllPass, dir / "S1_LEQ.csv"));
     ASSERT_TRUE(writer.formatHeader(orv::LeqFileKind::AllPass, sampleInfo(), 1));
@@ -211,11 +192,7 @@ TEST(LeqResults, RollsOverIntoNumberedPartsWithTheSameHeader) {
     EXPECT_EQ(orv::ResultNaming::leqPart("/o/S1_LEQ3OCT.csv", 12), "/o/S1_LEQ3OCT_12.csv");
 }
 
-TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
-    TempDir dir;
-    std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
+TEST_F(Writers, LeqConcurrentWritersNeverInterleaveLinesOrLoseRows) {
     orv::LeqResultsWriter writer(run, 121);  // 100 rows per part
     orv::ResultHeaderInfo info = sampleInfo();
     for (auto kind : {orv::LeqFileKind::AllPass, orv::LeqFileKind::Octave}) {
@@ -263,8 +240,7 @@ TEST(LeqResults, ConcurrentWritersNeverInterleaveLinesOrLoseRows) {
     }
 }
 
-TEST(ResultNames, FlatAndSubDirectoryLayouts) {
-    TempDir dir;
+TEST_F(Writers, NamesInTheFlatAndSubDirectoryLayouts) {
     orv::ProcessingSettings s;
     s.outputDir = dir.path() + "/";
     s.generalWeighting = 1;
@@ -304,11 +280,7 @@ TEST(ResultNames, FlatAndSubDirectoryLayouts) {
     EXPECT_EQ(orv::ResultNaming(s, "S1", 2).leq(orv::LeqFileKind::AllPass, 0), d + "LEQ_A_4_F.csv");
 }
 
-TEST(ResultFiles, ReplacedNotAppendedAndFailuresReported) {
-    TempDir dir;
-    std::string console;
-    platform::Console out(&console);
-    orv::RunResults run(out);
+TEST_F(Writers, FilesReplacedNotAppendedAndFailuresReported) {
     testing_support::writeFile(dir / "S1.csv", "an older and much longer result file\r\n");
     {
         orv::ResultFile f;

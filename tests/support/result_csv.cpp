@@ -7,7 +7,9 @@
 #include "support/test_support.h"
 
 namespace testing_support {
+namespace {
 
+// The quoted fields of one CSV line.
 std::vector<std::string> csvFields(const std::string& line) {
     std::vector<std::string> out;
     std::size_t i = 0;
@@ -19,6 +21,8 @@ std::vector<std::string> csvFields(const std::string& line) {
     }
     return out;
 }
+
+}  // namespace
 
 std::vector<std::vector<std::string>> resultRows(const std::string& path) {
     std::istringstream in(readFile(path));

@@ -6,8 +6,6 @@
 
 namespace testing_support {
 
-// The quoted fields of one CSV line.
-std::vector<std::string> csvFields(const std::string& line);
 // The data rows of a result file (after the 21 header lines), as fields. Every line must
 // end in CR LF.
 std::vector<std::vector<std::string>> resultRows(const std::string& path);

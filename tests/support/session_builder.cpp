@@ -27,13 +27,6 @@ void addLine(std::string& text, const char* key, const std::string& value) {
     if (!value.empty()) text += std::string(key) + ": " + value + "\r\n";
 }
 
-}  // namespace
-
-std::string formatInfoDateTime(const InfoDateTime& t) {
-    return format("%02u/%02u/%04u %02u:%02u:%02u", t.day, t.month, t.year, t.hour, t.minute,
-                  t.second);
-}
-
 std::string infoFileText(const InfoFields& f) {
     std::string text;
     addLine(text, "SESSION NAME", f.sessionName);
@@ -44,14 +37,10 @@ std::string infoFileText(const InfoFields& f) {
     addLine(text, "RANGE MULTIPLIER", f.rangeMultiplier);
     addLine(text, "TRIG SETTING", f.trigSetting);
     addLine(text, "TRIG PRE REC LENGTH", f.trigPreRecLength);
-    addLine(text, "TRIG TYPE", f.trigType);
-    for (const std::string& line : f.extraLines) text += line;
     return text;
 }
 
-void writeInfoFile(const std::string& path, const InfoFields& fields) {
-    writeFile(path, infoFileText(fields));
-}
+}  // namespace
 
 std::vector<LevelRow> makeRows(std::size_t count, std::size_t firstSlot,
                                const std::function<void(std::size_t slot, LevelRow&)>& fill) {
@@ -86,15 +75,6 @@ std::string levelFileText(const LevelFileHeader& h, const std::vector<LevelRow>&
     return text;
 }
 
-std::string levelFileName(const LevelFileHeader& h) {
-    return format("%04u%02u%02u_%02u.csv", h.year, h.month, h.day, h.hour);
-}
-
-void writeLevelFile(const std::string& path, const LevelFileHeader& header,
-                    const std::vector<LevelRow>& rows) {
-    writeFile(path, levelFileText(header, rows));
-}
-
 SessionLayout namedSession(const std::string& name) {
     SessionLayout layout;
     layout.info.sessionName = name;
@@ -107,11 +87,14 @@ std::string writeSession(const std::string& dir, const SessionLayout& layout) {
     if (layout.writeInfo) {
         std::string infName = layout.infName;
         if (infName.empty()) infName = dir.substr(dir.find_last_of('/') + 1) + ".inf";
-        writeInfoFile(dir + "/" + infName, layout.info);
+        writeFile(dir + "/" + infName, infoFileText(layout.info));
     }
     for (const LevelFileLayout& file : layout.levelFiles) {
-        const std::string name = file.name.empty() ? levelFileName(file.header) : file.name;
-        writeLevelFile(dir + "/" + file.dataDir + "/" + name, file.header, file.rows);
+        const LevelFileHeader& h = file.header;
+        const std::string name =
+            file.name.empty() ? format("%04u%02u%02u_%02u.csv", h.year, h.month, h.day, h.hour)
+                              : file.name;
+        writeFile(dir + "/" + file.dataDir + "/" + name, levelFileText(h, file.rows));
     }
     for (const std::string& wave : layout.waveFiles) writeFile(dir + "/" + wave, "");
     for (const std::string& extra : layout.extraDirs) makeDirs(dir + "/" + extra);

@@ -10,10 +10,6 @@
 
 namespace testing_support {
 
-struct InfoDateTime {
-    unsigned day = 17, month = 9, year = 2020, hour = 8, minute = 0, second = 0;
-};
-
 // The settings of an information file. Empty strings leave their line out.
 struct InfoFields {
     std::string sessionName = "Session1";
@@ -24,14 +20,7 @@ struct InfoFields {
     std::string rangeMultiplier = "1.0";
     std::string trigSetting = "OFF";
     std::string trigPreRecLength;
-    std::string trigType;
-    std::vector<std::string> extraLines;  // appended as they are
 };
-
-// "KEY: value" lines with CR LF ends, in the order of the fields above.
-std::string infoFileText(const InfoFields& fields);
-std::string formatInfoDateTime(const InfoDateTime& t);  // "dd/mm/yyyy hh:mm:ss"
-void writeInfoFile(const std::string& path, const InfoFields& fields);
 
 struct LevelFileHeader {
     std::string sessionTitle = "Session1";
@@ -58,20 +47,17 @@ std::vector<LevelRow> makeHour(const std::function<void(std::size_t slot, LevelR
 // The file text in the logger's hourly layout (six header lines, then one row per record,
 // every line ending in CR LF).
 std::string levelFileText(const LevelFileHeader& header, const std::vector<LevelRow>& rows);
-// The logger's file name for the header's hour: yyyymmdd_hh.csv.
-std::string levelFileName(const LevelFileHeader& header);
-void writeLevelFile(const std::string& path, const LevelFileHeader& header,
-                    const std::vector<LevelRow>& rows);
 
 struct LevelFileLayout {
     std::string dataDir = "data.000";
-    std::string name;  // empty: levelFileName(header)
+    std::string name;  // empty: the logger's name for the header's hour, yyyymmdd_hh.csv
     LevelFileHeader header;
     std::vector<LevelRow> rows = makeRows(10);
 };
 
-// A session directory. Written by writeSession as dir/<infName>, dir/<dataDir>/<level file>
-// and an empty file for every wave file path.
+// A session directory. Written by writeSession as dir/<infName> ("KEY: value" lines with CR LF
+// ends, in the order of InfoFields), dir/<dataDir>/<level file> and an empty file for every
+// wave file path.
 struct SessionLayout {
     bool writeInfo = true;
     std::string infName;  // empty: "<last part of dir>.inf"
